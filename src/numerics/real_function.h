@@ -20,6 +20,9 @@ class ZRXRealFunction {
     // Non-const: an evaluation may update caches of the derived object.
     virtual double operator()(double x) = 0;
 
+    // Not a slot: lets the root finder choose its integer ending.
+    bool mGetIntegerX() const { return mIntegerX; }
+
     virtual double mGetAbsoluteToleranceForX() const;
     virtual double mGetRelativeToleranceForX() const;
     virtual double mGetAbsoluteToleranceForF() const;

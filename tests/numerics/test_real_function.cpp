@@ -18,7 +18,6 @@ class Linear : public ZRXRealFunction {
     void setIntegerX(bool integerX) { mIntegerX = integerX; }
     void setScaleForF(double scale) { mScaleForF = scale; }
     void setAbsoluteToleranceForX(double tolerance) { mAbsoluteToleranceForX = tolerance; }
-    bool integerX() const { return mIntegerX; }
     double scaleForF() const { return mScaleForF; }
 };
 
@@ -30,7 +29,7 @@ class LooseArgument : public Linear {
 
 TEST(RealFunction, DefaultTolerances) {
     const Linear f;
-    EXPECT_FALSE(f.integerX());
+    EXPECT_FALSE(f.mGetIntegerX());
     EXPECT_EQ(f.scaleForF(), 0.0);
     EXPECT_EQ(f.mGetAbsoluteToleranceForX(), 1e-30);
     EXPECT_EQ(f.mGetRelativeToleranceForX(), 1e-12);
@@ -100,12 +99,12 @@ TEST(RealFunction, AssignmentCopiesTolerances) {
     Linear target;
     ZRXRealFunction& base = target;
     EXPECT_EQ(&(base = source), &base);
-    EXPECT_TRUE(target.integerX());
+    EXPECT_TRUE(target.mGetIntegerX());
     EXPECT_EQ(target.scaleForF(), 7.0);
     EXPECT_EQ(target.mGetAbsoluteToleranceForX(), 0.5);
 
     base = target;  // to itself
-    EXPECT_TRUE(target.integerX());
+    EXPECT_TRUE(target.mGetIntegerX());
     EXPECT_EQ(target.scaleForF(), 7.0);
     EXPECT_EQ(target.mGetAbsoluteToleranceForX(), 0.5);
     EXPECT_EQ(target.mGetRelativeToleranceForF(), 1e-12);
