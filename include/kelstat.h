@@ -50,10 +50,12 @@ extern "C" {
 
 /** Success. */
 #define KEL_OK 0
-/** Invalid input; nothing was written. */
+/** Invalid input (see the stem-and-leaf contract below). */
 #define KEL_STEMLEAF_INVALID_INPUT 300001
 /** A value lies 2 147 000 000 leaf units or more from zero. */
 #define KEL_STEMLEAF_VALUE_TOO_LARGE 300002
+/** Most lines a display may have; a run that would need more is refused with 300001. */
+#define KEL_STEMLEAF_MAX_LINES 10000000
 
 /* ---------------------------------------------------------------------------------------------
  * Stem-and-leaf scale (56 bytes, caller-owned).
@@ -93,22 +95,84 @@ typedef struct kel_StemAndLeaf {
     uint8_t isComplete;         /* 1 once a run has completed                           */
 } kel_StemAndLeaf;
 
+/*
+ * Stem-and-leaf call sequence: fill `increment` and `trimOutliers` of a scale record, call
+ * kel_FindStemAndLeafScaleInfo, create a container, call kel_RunStemAndLeaf with the same column
+ * and scale record, read the container, delete it. The column is n doubles sorted ascending; the
+ * library never sorts, copies or modifies it, and keeps no pointer to it.
+ *
+ * Bad input is refused with KEL_STEMLEAF_INVALID_INPUT (300001) and nothing is written:
+ *   - a null data, scale-record or container pointer;
+ *   - n = 0, or n above 2 147 483 647 (positions in a display are 32-bit);
+ *   - a column holding NaN, or not sorted ascending (ties are fine; -0.0 and +0.0 are equal);
+ *   - kel_RunStemAndLeaf only: a scale record whose leafUnit is not finite and positive, or whose
+ *     leavesPerLine is not 1, 2, 5 or 10;
+ *   - kel_RunStemAndLeaf only: a container that already holds a display (isComplete set, or lines
+ *     or outlier arrays attached); its content stays intact.
+ * Infinite values are not refused: they saturate like any value 2 147 000 000 leaf units or more
+ * from zero (see kel_RunStemAndLeaf), and no call on them hangs.
+ *
+ * Thread safety: no shared state; calls on different records and containers may run concurrently.
+ * One container must not be run, read and deleted from two threads at once.
+ */
+
 /**
  * Chooses the scale of a stem-and-leaf display of the sorted column data[0..n-1].
- * (Contract details: see the stem-and-leaf section of the README.)
+ *
+ * The caller fills scale->increment and scale->trimOutliers.
+ *   - increment > 0 (increment mode): the line width is the smallest 1, 2, 5 or 10 times a power
+ *     of ten not below 0.99999 x increment; while the retained data span more than 48 such widths
+ *     the increment is enlarged by 1.1 and the choice repeated. The enlarged increment is written
+ *     back.
+ *   - increment <= 0 or NaN (automatic mode): the narrowest such width giving at most
+ *     round(10 log10 n) lines, held to 3..18, is chosen; increment is left as it was.
+ *   - trimOutliers nonzero and n >= 3: values beyond Tukey's fences (1.5 hinge spreads outside
+ *     the hinges) do not enter the scale.
+ * Extremes closer than 0.01 % plus 1e-9 count as one value: highValue is then raised to
+ * 1 + low + 0.0001 |low| and a single width is chosen.
+ *
+ * On success writes leafUnit (an exact power of ten), leavesPerLine, lineCount, lowValue,
+ * highValue and increment, and returns KEL_OK. Quotients of 2 147 000 000 leaf units or more
+ * saturate; the scale returned then makes kel_RunStemAndLeaf answer 300002 (lineCount may be
+ * negative, having wrapped in 32 bits). Returns 300001 on bad input (above), writing nothing.
  */
 KELSTAT_API int32_t kel_FindStemAndLeafScaleInfo(const double* data, uint32_t n,
                                                  kel_StemAndLeafScaleInfo* scale);
 
-/** Allocates an empty container (medianLine -1, everything else zero). */
+/**
+ * Allocates an empty container: medianLine -1, every other field zero or NULL. The container and
+ * everything later attached to it belong to the library; release them only with
+ * kel_DeleteStemAndLeafContainer. Memory exhaustion is not turned into a code.
+ */
 KELSTAT_API kel_StemAndLeaf* kel_CreateStemAndLeafContainer(void);
 
-/** Builds the display of data[0..n-1] at the given scale into a fresh container. */
+/**
+ * Builds the display of the sorted column data[0..n-1] at the scale of *scale (leafUnit,
+ * leavesPerLine, increment and trimOutliers are read) into a container fresh from
+ * kel_CreateStemAndLeafContainer. One container serves one run.
+ *
+ * On KEL_OK the container holds the lines (ascending, a -0 line before the +0 line when the data
+ * reach both sides of zero), their leaves and depths, the median line (-1 when the median falls
+ * between two lines), the outliers in leaf units, and isComplete = 1. A line is one leaf unit
+ * times leavesPerLine wide, or one stem wide when every retained leaf would be 0 and no
+ * increment was requested.
+ *
+ * Results:
+ *   KEL_OK (0)                         success;
+ *   KEL_STEMLEAF_VALUE_TOO_LARGE (300002) a value lies 2 147 000 000 leaf units or more from zero
+ *                                      (infinite values included): only leafUnit is written;
+ *   KEL_STEMLEAF_INVALID_INPUT (300001) bad input (see above): nothing is written; or the display
+ *                                      would have more than KEL_STEMLEAF_MAX_LINES lines: only
+ *                                      leafUnit is written, nothing is attached.
+ */
 KELSTAT_API int32_t kel_RunStemAndLeaf(const double* data, uint32_t n,
                                        const kel_StemAndLeafScaleInfo* scale,
                                        kel_StemAndLeaf* container);
 
-/** Releases a container and everything hanging from it; sets *container to NULL. */
+/**
+ * Releases a container and every array attached to it, then sets *container to NULL. A NULL
+ * address, or the address of a NULL pointer, does nothing.
+ */
 KELSTAT_API void kel_DeleteStemAndLeafContainer(kel_StemAndLeaf** container);
 
 /* ---------------------------------------------------------------------------------------------

@@ -4,14 +4,13 @@
 
 #include <cstdint>
 
-struct kel_StemAndLeaf;
-struct kel_StemAndLeafScaleInfo;
+#include "kelstat.h"
 
 namespace kelstat {
 
 // A display with more lines than this cannot be read, and its line records alone could exhaust
 // the host's memory.
-constexpr std::int64_t kMostDisplayLines = 10000000;
+constexpr std::int64_t kMostDisplayLines = KEL_STEMLEAF_MAX_LINES;
 
 // Copies values[from..to] (inclusive) into a new array attached to the container as its high
 // (isHigh) or low outliers. Does nothing when to < from.
