@@ -1,6 +1,7 @@
 #!/usr/bin/env bash
 # Installs the build tree into a scratch prefix, then builds the tiny C consumer against it twice:
-# through find_package(kelstat) and through pkg-config. Both binaries must run and succeed.
+# through find_package(kelstat) and through pkg-config (which places the prefix where the .pc file
+# now lies, as the tree was installed elsewhere than configured). Both binaries must run and succeed.
 set -euo pipefail
 build=$1 consumer_src=$2 work=$3
 rm -rf "$work"; mkdir -p "$work"
@@ -14,6 +15,6 @@ LD_LIBRARY_PATH="$libdir" "$work/cmake-build/c_consumer"
 
 export PKG_CONFIG_PATH="$libdir/pkgconfig"
 cc -std=c11 -Wall -Wextra -Werror "$consumer_src/main.c" -o "$work/pc_consumer" \
-   $(pkg-config --cflags --libs kelstat)
+   $(pkg-config --define-prefix --cflags --libs kelstat)
 LD_LIBRARY_PATH="$libdir" "$work/pc_consumer"
 echo "installed tree usable through CMake and pkg-config"

@@ -1,0 +1,248 @@
+// kelstat stem: reads a column of numbers, has the library lay out its stem-and-leaf display, and
+// renders it as text.
+#include <algorithm>
+#include <cmath>
+#include <cstdint>
+#include <cstdio>
+#include <cstdlib>
+#include <limits>
+#include <string>
+#include <vector>
+
+#include "commands.h"
+#include "kelstat.h"
+#include "read_numbers.h"
+
+namespace kelstat::cli {
+
+namespace {
+
+struct StemOptions {
+    std::string path;
+    double increment = 0;
+    bool trim = false;
+};
+
+void printStemUsage(std::FILE* out) {
+    std::fprintf(out,
+                 "usage: kelstat stem [--increment X] [--trim] [FILE]\n"
+                 "\n"
+                 "Shows a stem-and-leaf display of the numbers in FILE (standard input when FILE\n"
+                 "is missing or '-'). Numbers are separated by white space, commas or new lines.\n"
+                 "\n"
+                 "options:\n"
+                 "  --increment X  line width wanted (rounded to 1, 2, 5 or 10 times a power of\n"
+                 "                 ten, and widened while the display would exceed 49 lines);\n"
+                 "                 0 or less chooses the width automatically (the default)\n"
+                 "  --trim         set values beyond Tukey's fences aside as LO: and HI: outliers\n"
+                 "  --help         show this help\n"
+                 "  --version      show the version\n"
+                 "\n"
+                 "Each row shows the depth (values counted from the nearer end; the median line's\n"
+                 "own count in parentheses), the stem, and one digit per value. The stem -0 holds\n"
+                 "negative values between -1 and 0 stem units.\n");
+}
+
+// Digits after the decimal point that multiples of the leaf unit need.
+int decimalsOfLeafUnit(double leafUnit) {
+    return leafUnit < 1 ? static_cast<int>(std::lround(-std::log10(leafUnit))) : 0;
+}
+
+// A value in data units, written with the leaf unit's decimals (99 x 0.1 prints as 9.9).
+std::string formatAtLeafUnit(double value, double leafUnit) {
+    // Beyond these the fixed notation is unreadable; the general one says the same.
+    constexpr int kMostFixedDecimals = 20;
+    constexpr double kLargestFixed = 1e21;
+    const int decimals = decimalsOfLeafUnit(leafUnit);
+    char buffer[64];
+    if (decimals > kMostFixedDecimals || std::fabs(value) >= kLargestFixed) {
+        std::snprintf(buffer, sizeof buffer, "%.15g", value);
+    } else {
+        std::snprintf(buffer, sizeof buffer, "%.*f", decimals, value);
+    }
+    return buffer;
+}
+
+// The width of a line in leaf units. The library widens a line to a whole stem when every leaf
+// would be 0 and no increment was asked for; all leaves 0 is how that shows in the display.
+double leafUnitsPerLine(const kel_StemAndLeafScaleInfo& scale, const kel_StemAndLeaf& display) {
+    if (scale.increment > 0 || scale.leavesPerLine == 10) return scale.leavesPerLine;
+    bool anyLeaf = false;
+    for (std::uint32_t i = 0; i < display.lineCount; ++i) {
+        const kel_StemAndLeafLine& line = display.lines[i];
+        for (std::int32_t j = 0; j < line.leafCount; ++j) {
+            if (line.leaves[j] != 0) return scale.leavesPerLine;
+            anyLeaf = true;
+        }
+    }
+    return anyLeaf ? 10.0 : scale.leavesPerLine;
+}
+
+std::string outlierRow(const char* label, const std::int32_t* values, std::int32_t count,
+                       double leafUnit) {
+    std::string row = label;
+    for (std::int32_t i = 0; i < count; ++i) {
+        row += i == 0 ? " " : ", ";
+        row += formatAtLeafUnit(values[i] * leafUnit, leafUnit);
+    }
+    return row;
+}
+
+void renderDisplay(const kel_StemAndLeafScaleInfo& scale, const kel_StemAndLeaf& display,
+                   std::size_t count) {
+    const double leafUnit = display.leafUnit;
+    const double lineWidth = leafUnit * leafUnitsPerLine(scale, display);
+    std::printf("Leaf unit: %s   Line width: %s   N = %zu\n",
+                formatAtLeafUnit(leafUnit, leafUnit).c_str(),
+                formatAtLeafUnit(lineWidth, leafUnit).c_str(), count);
+
+    std::vector<std::string> depths;
+    std::vector<std::string> stems;
+    std::size_t depthWidth = 0;
+    std::size_t stemWidth = 0;
+    for (std::uint32_t i = 0; i < display.lineCount; ++i) {
+        const kel_StemAndLeafLine& line = display.lines[i];
+        const bool isMedian = static_cast<std::int32_t>(i) == display.medianLine;
+        depths.push_back(isMedian ? "(" + std::to_string(line.leafCount) + ")"
+                                  : std::to_string(line.depth));
+        stems.push_back(line.stem == 0 && line.isPositive == 0 ? "-0" : std::to_string(line.stem));
+        depthWidth = std::max(depthWidth, depths.back().size());
+        stemWidth = std::max(stemWidth, stems.back().size());
+    }
+
+    if (display.lowOutlierCount > 0) {
+        std::printf(
+            "%s\n",
+            outlierRow("LO:", display.lowOutliers, display.lowOutlierCount, leafUnit).c_str());
+    }
+    for (std::uint32_t i = 0; i < display.lineCount; ++i) {
+        const kel_StemAndLeafLine& line = display.lines[i];
+        std::string leaves;
+        for (std::int32_t j = 0; j < line.leafCount; ++j) {
+            leaves += static_cast<char>('0' + line.leaves[j]);
+        }
+        std::printf("%*s  %*s |%s%s\n", static_cast<int>(depthWidth), depths[i].c_str(),
+                    static_cast<int>(stemWidth), stems[i].c_str(), leaves.empty() ? "" : " ",
+                    leaves.c_str());
+    }
+    if (display.highOutlierCount > 0) {
+        std::printf(
+            "%s\n",
+            outlierRow("HI:", display.highOutliers, display.highOutlierCount, leafUnit).c_str());
+    }
+}
+
+// True when the command should go on to read and display; otherwise exitStatus says how it ends
+// (help and version end here successfully).
+bool parseStemOptions(int argc, char** argv, StemOptions& options, int& exitStatus) {
+    exitStatus = kExitUsage;
+    bool pathSeen = false;
+    bool optionsEnded = false;
+    for (int i = 1; i < argc; ++i) {
+        const std::string argument = argv[i];
+        if (!optionsEnded && argument.size() > 1 && argument[0] == '-') {
+            if (argument == "--") {
+                optionsEnded = true;
+                continue;
+            }
+            if (argument == "--help" || argument == "-h") {
+                printStemUsage(stdout);
+                exitStatus = kExitSuccess;
+                return false;
+            }
+            if (argument == "--version") {
+                std::printf("kelstat %s\n", KELSTAT_VERSION_STRING);
+                exitStatus = kExitSuccess;
+                return false;
+            }
+            if (argument == "--trim") {
+                options.trim = true;
+                continue;
+            }
+            const std::string incrementOption = "--increment";
+            if (argument.compare(0, incrementOption.size(), incrementOption) == 0) {
+                std::string value;
+                if (argument == incrementOption && i + 1 < argc) {
+                    value = argv[++i];
+                } else if (argument.size() > incrementOption.size() &&
+                           argument[incrementOption.size()] == '=') {
+                    value = argument.substr(incrementOption.size() + 1);
+                } else {
+                    std::fprintf(stderr, "kelstat stem: %s needs a number\n", argument.c_str());
+                    return false;
+                }
+                char* end = nullptr;
+                options.increment = std::strtod(value.c_str(), &end);
+                if (value.empty() || *end != '\0' || !std::isfinite(options.increment)) {
+                    std::fprintf(stderr,
+                                 "kelstat stem: --increment: \"%s\" is not a finite number\n",
+                                 value.c_str());
+                    return false;
+                }
+                continue;
+            }
+            std::fprintf(stderr, "kelstat stem: unknown option '%s' (see kelstat stem --help)\n",
+                         argument.c_str());
+            return false;
+        }
+        if (pathSeen) {
+            std::fprintf(stderr, "kelstat stem: only one FILE may be given\n");
+            return false;
+        }
+        options.path = argument;
+        pathSeen = true;
+    }
+    return true;
+}
+
+}  // namespace
+
+int runStemCommand(int argc, char** argv) {
+    StemOptions options;
+    int exitStatus = kExitUsage;
+    if (!parseStemOptions(argc, argv, options, exitStatus)) return exitStatus;
+
+    std::vector<double> values;
+    std::string error;
+    if (!readNumbersFromPath(options.path, values, error)) {
+        std::fprintf(stderr, "kelstat stem: %s\n", error.c_str());
+        return kExitUsage;
+    }
+    if (values.empty()) {
+        std::fprintf(stderr, "kelstat stem: no numbers to show\n");
+        return kExitUsage;
+    }
+    if (values.size() > static_cast<std::size_t>(std::numeric_limits<std::int32_t>::max())) {
+        std::fprintf(stderr, "kelstat stem: too many numbers (%zu)\n", values.size());
+        return kExitUsage;
+    }
+    std::sort(values.begin(), values.end());
+    const auto n = static_cast<std::uint32_t>(values.size());
+
+    kel_StemAndLeafScaleInfo scale{};
+    scale.increment = options.increment;
+    scale.trimOutliers = options.trim ? 1 : 0;
+    std::int32_t code = kel_FindStemAndLeafScaleInfo(values.data(), n, &scale);
+    kel_StemAndLeaf* display = nullptr;
+    if (code == KEL_OK) {
+        display = kel_CreateStemAndLeafContainer();
+        code = kel_RunStemAndLeaf(values.data(), n, &scale, display);
+    }
+    if (code == KEL_OK) {
+        renderDisplay(scale, *display, values.size());
+    } else if (code == KEL_STEMLEAF_VALUE_TOO_LARGE) {
+        std::fprintf(stderr,
+                     "kelstat stem: a value lies 2147000000 leaf units or more from zero at leaf "
+                     "unit %g; try a larger --increment\n",
+                     scale.leafUnit);
+    } else {
+        std::fprintf(stderr,
+                     "kelstat stem: the library refused the data (code %d): the display would "
+                     "need more than %d lines\n",
+                     static_cast<int>(code), KEL_STEMLEAF_MAX_LINES);
+    }
+    kel_DeleteStemAndLeafContainer(&display);
+    return code == KEL_OK ? kExitSuccess : kExitRefused;
+}
+
+}  // namespace kelstat::cli
