@@ -4,7 +4,6 @@
 #include <cmath>
 #include <cstdint>
 #include <cstdlib>
-#include <memory>
 
 #include "kelstat.h"
 #include "stemleaf/stemleaf_scale.h"
@@ -13,9 +12,8 @@ namespace kelstat {
 
 namespace {
 
-// The quotient pass checks the order of a block of the column just before dividing it, so the
-// column is read from memory once; each block fits in the first-level cache.
-constexpr std::uint32_t kQuotientBlock = 1024;
+// Values per block of the leaf pass: 16 KiB of column, 8 KiB of leaves.
+constexpr std::int64_t kLeafBlock = 2048;
 
 void releaseArrays(kel_StemAndLeaf& container) {
     if (container.lines != nullptr) {
@@ -50,40 +48,41 @@ class DisplayUnderConstruction {
     kel_StemAndLeaf display_;
 };
 
-// Leaf-unit quotients of the whole column. False, with the quotients incomplete, when the column
-// is out of order or holds NaN.
-bool computeQuotients(const double* column, std::uint32_t n, double leafUnit,
-                      std::int32_t* quotients) {
-    if (std::isnan(column[0])) return false;
-    for (std::uint32_t start = 0; start < n; start += kQuotientBlock) {
-        const std::uint32_t end = n - start > kQuotientBlock ? start + kQuotientBlock : n;
-        unsigned outOfOrder = 0;
-        for (std::uint32_t i = std::max(start, 1u); i < end; ++i) {
-            outOfOrder |= !(column[i - 1] <= column[i]);
-        }
-        if (outOfOrder != 0) return false;
-        for (std::uint32_t i = start; i < end; ++i) {
-            quotients[i] = getIntegerEqualOrNextCloserToZero(column[i] / leafUnit);
-        }
+bool allMultiplesOfTen(const LeafQuotients& values, std::int64_t from, std::int64_t to) {
+    for (std::int64_t i = from; i <= to; ++i) {
+        if (values[i] % 10 != 0) return false;
     }
     return true;
 }
 
-bool allMultiplesOfTen(const std::int32_t* quotients, std::int64_t from, std::int64_t to) {
-    for (std::int64_t i = from; i <= to; ++i) {
-        if (quotients[i] % 10 != 0) return false;
+// The leaves of the values [from, to): each quotient's distance from the stem's base. False when
+// the column is out of order (or holds NaN) anywhere from column[from - 1] to column[to - 1].
+// Works in blocks that stay in the first-level cache between the order check and the leaves; the
+// leaf loop is plain code that the compiler vectorises, division and truncation included.
+bool fillLeavesOfOrderedColumn(const double* column, double leafUnit, std::int64_t from,
+                               std::int64_t to, std::int32_t stemInLeafUnits,
+                               std::int32_t* leaves) {
+    for (std::int64_t start = from; start < to; start += kLeafBlock) {
+        const std::int64_t end = std::min(to, start + kLeafBlock);
+        const auto checkFrom = static_cast<std::size_t>(std::max<std::int64_t>(start, 1));
+        if (!isAscendingRun(column, checkFrom, static_cast<std::size_t>(end))) return false;
+        std::int32_t* out = leaves + (start - from);
+        for (std::int64_t i = start; i < end; ++i) {
+            *out++ =
+                std::abs(getIntegerEqualOrNextCloserToZero(column[i] / leafUnit) - stemInLeafUnits);
+        }
     }
     return true;
 }
 
 }  // namespace
 
-void getOutliers(const std::int32_t* values, std::int64_t from, std::int64_t to, bool isHigh,
+void getOutliers(const LeafQuotients& values, std::int64_t from, std::int64_t to, bool isHigh,
                  kel_StemAndLeaf& container) {
     if (to < from) return;
     const std::int64_t count = to - from + 1;
     auto* copy = new std::int32_t[static_cast<std::size_t>(count)];
-    std::copy(values + from, values + to + 1, copy);
+    for (std::int64_t i = 0; i < count; ++i) copy[i] = values[from + i];
     if (isHigh) {
         container.highOutliers = copy;
         container.highOutlierCount = static_cast<std::int32_t>(count);
@@ -93,15 +92,15 @@ void getOutliers(const std::int32_t* values, std::int64_t from, std::int64_t to,
     }
 }
 
-std::int64_t findDepth(const std::int32_t* quotients, const double* column, std::int64_t position,
-                       std::int64_t end, std::int64_t upperEdge, bool negativeSide) {
+std::int64_t findDepth(const LeafQuotients& values, std::int64_t position, std::int64_t end,
+                       std::int64_t upperEdge, bool negativeSide) {
     const bool takesEdge = upperEdge < 0;
     const bool isNegativeZeroLine = upperEdge == 0 && negativeSide;
     const auto belongs = [&](std::int64_t i) {
-        const std::int64_t quotient = quotients[i];
+        const std::int64_t quotient = values[i];
         if (quotient < upperEdge) return true;
         if (quotient != upperEdge) return false;
-        return takesEdge || (isNegativeZeroLine && column[i] < 0.0);
+        return takesEdge || (isNegativeZeroLine && values.column[i] < 0.0);
     };
 
     if (position >= end || !belongs(position)) return position;
@@ -179,13 +178,17 @@ std::int32_t runStemAndLeaf(const double* column, std::uint32_t n,
     const double low = column[lowIndex];
     const double high = column[highIndex];
 
-    std::unique_ptr<std::int32_t[]> quotients(new std::int32_t[n]);
-    if (!computeQuotients(column, n, leafUnit, quotients.get())) return KEL_STEMLEAF_INVALID_INPUT;
-    // The quotients ascend with the column, so a saturated one sits at an end.
+    // The column's order is checked block by block as the leaves are written, so that it is read
+    // from memory once; paths that end before that check the whole column first, and everything
+    // built stays in the display under construction until the check has passed.
+    if (std::isnan(column[0])) return KEL_STEMLEAF_INVALID_INPUT;
+    const LeafQuotients quotients{column, leafUnit};
+    // In an ascending column the quotients ascend too, so a saturated one sits at an end.
     const auto saturated = [](std::int32_t q) {
         return q == kQuotientLimit || q == -kQuotientLimit;
     };
-    if (saturated(quotients[0]) || saturated(quotients[n - 1])) {
+    if (saturated(quotients[0]) || saturated(quotients[std::int64_t{n} - 1])) {
+        if (!isAscendingWithoutNaN(column, n)) return KEL_STEMLEAF_INVALID_INPUT;
         container.leafUnit = leafUnit;
         return KEL_STEMLEAF_VALUE_TOO_LARGE;
     }
@@ -194,8 +197,7 @@ std::int32_t runStemAndLeaf(const double* column, std::uint32_t n,
     double width = scale.leavesPerLine;
     if (scale.leavesPerLine == 10.0) {
         width = 10.0;
-    } else if (!(scale.increment > 0.0) &&
-               allMultiplesOfTen(quotients.get(), lowIndex, highIndex)) {
+    } else if (!(scale.increment > 0.0) && allMultiplesOfTen(quotients, lowIndex, highIndex)) {
         width = 10.0;
     }
     const double lineSpan = leafUnit * width;
@@ -205,7 +207,9 @@ std::int32_t runStemAndLeaf(const double* column, std::uint32_t n,
     const std::int64_t lineCount =
         std::int64_t{getIntegerEqualOrNextCloserToZero(high / lineSpan)} -
         getIntegerEqualOrNextCloserToZero(low / lineSpan) + 1 + zeroLine;
-    if (lineCount > kMostDisplayLines) {
+    // Fewer than one line only comes from a column out of order.
+    if (lineCount < 1 || lineCount > kMostDisplayLines) {
+        if (lineCount < 1 || !isAscendingWithoutNaN(column, n)) return KEL_STEMLEAF_INVALID_INPUT;
         container.leafUnit = leafUnit;
         return KEL_STEMLEAF_INVALID_INPUT;
     }
@@ -213,7 +217,10 @@ std::int32_t runStemAndLeaf(const double* column, std::uint32_t n,
     DisplayUnderConstruction building;
     kel_StemAndLeaf& display = building.display();
     display.leafUnit = leafUnit;
-    getOutliers(quotients.get(), 0, lowIndex - 1, false, display);
+    if (!isAscendingRun(column, 1, static_cast<std::size_t>(std::max<std::int64_t>(lowIndex, 1)))) {
+        return KEL_STEMLEAF_INVALID_INPUT;
+    }
+    getOutliers(quotients, 0, lowIndex - 1, false, display);
 
     display.lines = new kel_StemAndLeafLine[static_cast<std::size_t>(lineCount)]();
     display.lineCount = static_cast<std::uint32_t>(lineCount);
@@ -236,7 +243,7 @@ std::int32_t runStemAndLeaf(const double* column, std::uint32_t n,
             base += step;
         }
         const std::int64_t next =
-            findDepth(quotients.get(), column, position, retainedEnd, upperEdge, negativeSide);
+            findDepth(quotients, position, retainedEnd, upperEdge, negativeSide);
 
         kel_StemAndLeafLine& line = display.lines[i];
         const std::int64_t stem = base / 10;
@@ -246,15 +253,17 @@ std::int32_t runStemAndLeaf(const double* column, std::uint32_t n,
         if (next > position) {
             auto* leaves = new std::int32_t[static_cast<std::size_t>(next - position)];
             line.leaves = leaves;
-            const auto stemInLeafUnits = static_cast<std::int32_t>(stem * 10);
-            const std::int32_t* source = quotients.get() + position;
-            for (std::int64_t j = 0; j < next - position; ++j) {
-                leaves[j] = std::abs(source[j] - stemInLeafUnits);
+            if (!fillLeavesOfOrderedColumn(column, leafUnit, position, next,
+                                           static_cast<std::int32_t>(stem * 10), leaves)) {
+                return KEL_STEMLEAF_INVALID_INPUT;
             }
         }
         position = next;
     }
-    getOutliers(quotients.get(), position, std::int64_t{n} - 1, true, display);
+    if (!isAscendingRun(column, static_cast<std::size_t>(std::max<std::int64_t>(position, 1)), n)) {
+        return KEL_STEMLEAF_INVALID_INPUT;
+    }
+    getOutliers(quotients, position, std::int64_t{n} - 1, true, display);
 
     display.isComplete = 1;
     computeCountsToMedian(display);

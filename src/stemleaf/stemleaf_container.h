@@ -5,6 +5,7 @@
 #include <cstdint>
 
 #include "kelstat.h"
+#include "stemleaf/stemleaf_scale.h"
 
 namespace kelstat {
 
@@ -12,9 +13,21 @@ namespace kelstat {
 // the host's memory.
 constexpr std::int64_t kMostDisplayLines = KEL_STEMLEAF_MAX_LINES;
 
-// Copies values[from..to] (inclusive) into a new array attached to the container as its high
-// (isHigh) or low outliers. Does nothing when to < from.
-void getOutliers(const std::int32_t* values, std::int64_t from, std::int64_t to, bool isHigh,
+// The leaf-unit quotients Q(column[i] / leafUnit) of a column, computed where they are needed
+// rather than stored: each is used at most twice, and a stored copy would cost as much memory
+// traffic as the leaves themselves.
+struct LeafQuotients {
+    const double* column;
+    double leafUnit;
+
+    std::int32_t operator[](std::int64_t i) const {
+        return getIntegerEqualOrNextCloserToZero(column[i] / leafUnit);
+    }
+};
+
+// Copies the quotients values[from..to] (inclusive) into a new array attached to the container
+// as its high (isHigh) or low outliers. Does nothing when to < from.
+void getOutliers(const LeafQuotients& values, std::int64_t from, std::int64_t to, bool isHigh,
                  kel_StemAndLeaf& container);
 
 // The end of the run of values from position onwards (up to end, exclusive) that belong to the
@@ -22,8 +35,8 @@ void getOutliers(const std::int32_t* values, std::int64_t from, std::int64_t to,
 // negative side of zero; on the -0 line (edge 0, negative side) also the values below zero whose
 // quotient is 0. The column is ascending, so the values that belong come first; the search
 // gallops, costing O(log(line length)) rather than a step per value.
-std::int64_t findDepth(const std::int32_t* quotients, const double* column, std::int64_t position,
-                       std::int64_t end, std::int64_t upperEdge, bool negativeSide);
+std::int64_t findDepth(const LeafQuotients& values, std::int64_t position, std::int64_t end,
+                       std::int64_t upperEdge, bool negativeSide);
 
 // Fills every line's depth and the median line's index from the leaf and outlier counts.
 void computeCountsToMedian(kel_StemAndLeaf& container);

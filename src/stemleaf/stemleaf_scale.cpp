@@ -5,6 +5,10 @@
 #include <cstdint>
 #include <cstring>
 
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
+
 #include "kelstat.h"
 #include "stemleaf/stemleaf_power_table.h"
 
@@ -38,9 +42,8 @@ constexpr int kMaxSearchSteps = 4000;
 // spread drops to 0) within about 7 900 rounds from the smallest subnormal request.
 constexpr int kMaxIncrementRounds = 10000;
 
-// Columns are checked for order in blocks, branch-free inside a block so the comparisons
-// vectorise, leaving early after the first block that fails.
-constexpr std::uint32_t kOrderCheckBlock = 1024;
+// Columns are checked for order in blocks, leaving early after the first block that fails.
+constexpr std::size_t kOrderCheckBlock = 4096;
 
 int maxLinesForSampleSize(std::uint32_t n) {
     const double lines = std::round(10.0 * std::log10(static_cast<double>(n)));
@@ -131,15 +134,34 @@ void findNicePositionWidth(double low, double high, const double* multipliers, i
     }
 }
 
+bool isAscendingRun(const double* data, std::size_t begin, std::size_t end) {
+    std::size_t i = begin;
+#if defined(__SSE2__)
+    // Four neighbour pairs per step in packed compares (an unordered compare fails, so NaN fails
+    // too); compilers leave the scalar form unvectorised since a compare may raise a flag.
+    __m128d ascending = _mm_castsi128_pd(_mm_set1_epi32(-1));
+    for (; i + 4 <= end; i += 4) {
+        const __m128d low =
+            _mm_and_pd(_mm_cmple_pd(_mm_loadu_pd(data + i - 1), _mm_loadu_pd(data + i)),
+                       _mm_cmple_pd(_mm_loadu_pd(data + i + 1), _mm_loadu_pd(data + i + 2)));
+        ascending = _mm_and_pd(ascending, low);
+    }
+    if (_mm_movemask_pd(ascending) != 3) return false;
+#endif
+    for (; i < end; ++i) {
+        if (!(data[i - 1] <= data[i])) return false;
+    }
+    return true;
+}
+
 bool isAscendingWithoutNaN(const double* data, std::uint32_t n) {
     if (n == 0) return true;
     if (std::isnan(data[0])) return false;
-    // Every NaN after the first value fails the comparison with its predecessor.
-    for (std::uint32_t start = 1; start < n; start += kOrderCheckBlock) {
-        const std::uint32_t end = n - start > kOrderCheckBlock ? start + kOrderCheckBlock : n;
-        unsigned outOfOrder = 0;
-        for (std::uint32_t i = start; i < end; ++i) outOfOrder |= !(data[i - 1] <= data[i]);
-        if (outOfOrder != 0) return false;
+    // Every NaN after the first value fails the comparison with its predecessor. Blocks let a
+    // column that fails early stop early.
+    for (std::size_t start = 1; start < n; start += kOrderCheckBlock) {
+        const std::size_t end = std::min<std::size_t>(n, start + kOrderCheckBlock);
+        if (!isAscendingRun(data, start, end)) return false;
     }
     return true;
 }

@@ -3,6 +3,7 @@
 #ifndef KELSTAT_STEMLEAF_STEMLEAF_SCALE_H
 #define KELSTAT_STEMLEAF_STEMLEAF_SCALE_H
 
+#include <cstddef>
 #include <cstdint>
 
 struct kel_StemAndLeafScaleInfo;
@@ -58,6 +59,10 @@ void getHingeInfo(const double* sorted, std::uint32_t n, StemAndLeafHingeInfo& o
 void findNicePositionWidth(double low, double high, const double* multipliers, int multiplierCount,
                            int maxLines, bool countZeroLine, int& lineCount, double& multiplier,
                            double& power, double& width);
+
+// True when data[i - 1] <= data[i] for every i in [begin, end), begin >= 1: ascending, ties
+// allowed, and no NaN after data[begin - 1].
+bool isAscendingRun(const double* data, std::size_t begin, std::size_t end);
 
 // True when the column ascends (ties allowed) and holds no NaN.
 bool isAscendingWithoutNaN(const double* data, std::uint32_t n);

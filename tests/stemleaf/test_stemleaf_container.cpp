@@ -219,7 +219,8 @@ TEST(StemLeafDisplay, DepthsWithoutAMedianLine) {
 }
 
 TEST(StemLeafDisplay, OutliersCopyTheirRange) {
-    const std::int32_t values[] = {-7, 1, 2, 3, 90};
+    const double column[] = {-0.7, 0.1, 0.2, 0.3, 9.0};
+    const LeafQuotients values{column, 0.1};
     kel_StemAndLeaf container{};
     getOutliers(values, 0, -1, false, container);
     EXPECT_EQ(container.lowOutliers, nullptr);
@@ -231,9 +232,9 @@ TEST(StemLeafDisplay, OutliersCopyTheirRange) {
 }
 
 TEST(StemLeafDisplay, FindDepthStopsAtTheFirstValueThatDoesNotBelong) {
-    // Quotients and values of a column with negative quotient-0 values around zero.
-    const std::int32_t quotients[] = {-3, -1, 0, 0, 0, 0, 2, 9, 10, 10, 25};
+    // Quotients -3, -1, 0, 0, 0, 0, 2, 9, 10, 10, 25: negative values of quotient 0 around zero.
     const double column[] = {-3, -1, -0.7, -0.2, 0, 0.4, 2, 9, 10, 10, 25};
+    const LeafQuotients quotients{column, 1.0};
     const struct {
         std::int64_t from, edge;
         bool negativeSide;
@@ -244,7 +245,7 @@ TEST(StemLeafDisplay, FindDepthStopsAtTheFirstValueThatDoesNotBelong) {
         {11, 100, false, 11}, {4, 2, false, 6},
     };
     for (const auto& c : cases) {
-        EXPECT_EQ(findDepth(quotients, column, c.from, 11, c.edge, c.negativeSide), c.expected)
+        EXPECT_EQ(findDepth(quotients, c.from, 11, c.edge, c.negativeSide), c.expected)
             << "from " << c.from << " edge " << c.edge;
     }
 }
