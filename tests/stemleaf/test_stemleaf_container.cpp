@@ -263,6 +263,10 @@ TEST(StemLeafBadInput, RefusedRunsWriteNothing) {
     const double sorted[] = {1, 2, 3};
     const double unsorted[] = {1, 3, 2};
     const double withNaN[] = {1, kNaN, 3};
+    // Out of order in ways that would otherwise end the run early.
+    const double saturatedUnsorted[] = {3e9, 1, 2};
+    const double tooManyLinesUnsorted[] = {0, 5, 1, 2e7};
+    const double descending[] = {5, 1};
     const kel_StemAndLeafScaleInfo good = fixedScale(1, 1);
     const struct {
         const char* name;
@@ -274,6 +278,9 @@ TEST(StemLeafBadInput, RefusedRunsWriteNothing) {
         {"n = 0", sorted, 0, good},
         {"unsorted", unsorted, 3, good},
         {"NaN", withNaN, 3, good},
+        {"saturated end, unsorted", saturatedUnsorted, 3, good},
+        {"too many lines, unsorted", tooManyLinesUnsorted, 4, fixedScale(1, 1, 1)},
+        {"descending", descending, 2, good},
         {"leaf unit 0", sorted, 3, fixedScale(0, 1)},
         {"negative leaf unit", sorted, 3, fixedScale(-1, 1)},
         {"infinite leaf unit", sorted, 3, fixedScale(kInf, 1)},

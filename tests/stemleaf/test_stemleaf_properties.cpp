@@ -6,7 +6,10 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdint>
+#include <cstring>
+#include <limits>
 #include <random>
+#include <utility>
 #include <vector>
 
 #include "kelstat.h"
@@ -251,6 +254,51 @@ TEST(StemLeafProperties, RandomColumnsMatchTheSlowConstruction) {
     // Both outcomes must have been exercised for the comparison to mean something.
     EXPECT_GT(built, kColumns * 3 / 4);
     EXPECT_GT(saturated, 0);
+}
+
+TEST(StemLeafProperties, ColumnsOutOfOrderAnywhereAreRefusedUntouched) {
+    // One pair swapped, or one NaN, at any place: among the low outliers, on any line (inside a
+    // block or across blocks of the leaf pass), among the high outliers.
+    ColumnMaker maker;
+    int refused = 0;
+    for (int column = 0; column < 1500; ++column) {
+        const auto n = static_cast<std::size_t>(maker.integer(2, 6000));
+        std::vector<double> x = maker.make(column % 7 == 5 ? 6 : column % 7, n);
+        kel_StemAndLeafScaleInfo scale{};
+        scale.trimOutliers = maker.integer(0, 1) ? 1 : 0;
+        ASSERT_EQ(kel_FindStemAndLeafScaleInfo(x.data(), static_cast<std::uint32_t>(n), &scale),
+                  KEL_OK);
+
+        const auto at =
+            static_cast<std::size_t>(maker.integer(0, static_cast<std::int64_t>(n) - 2));
+        if (column % 3 == 0) {
+            x[at + maker.integer(0, 1)] = std::numeric_limits<double>::quiet_NaN();
+        } else {
+            std::size_t i = at;
+            while (i + 1 < n && !(x[i] < x[i + 1])) ++i;
+            if (i + 1 == n) continue;  // no two distinct neighbours from here on
+            std::swap(x[i], x[i + 1]);
+        }
+        SCOPED_TRACE(::testing::Message() << "column " << column << " n " << n << " at " << at);
+
+        kel_StemAndLeaf container;
+        std::memset(&container, 0x5A, sizeof container);
+        container.isComplete = 0;
+        container.lines = nullptr;
+        container.lowOutliers = nullptr;
+        container.highOutliers = nullptr;
+        const kel_StemAndLeaf before = container;
+        const auto count = static_cast<std::uint32_t>(n);
+        EXPECT_EQ(kel_RunStemAndLeaf(x.data(), count, &scale, &container),
+                  KEL_STEMLEAF_INVALID_INPUT);
+        EXPECT_EQ(std::memcmp(&container, &before, sizeof container), 0);
+        const kel_StemAndLeafScaleInfo scaleBefore = scale;
+        EXPECT_EQ(kel_FindStemAndLeafScaleInfo(x.data(), count, &scale),
+                  KEL_STEMLEAF_INVALID_INPUT);
+        EXPECT_EQ(std::memcmp(&scale, &scaleBefore, sizeof scale), 0);
+        ++refused;
+    }
+    EXPECT_GT(refused, 1000);
 }
 
 }  // namespace
