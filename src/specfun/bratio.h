@@ -15,12 +15,15 @@ namespace kelstat {
 //   3  x outside [0, 1]           4  y outside [0, 1]
 //   5  |x + y - 1| > 3 * 2^-52    6  x = a = 0
 //   7  y = b = 0
-// x = 0 or b = 0 gives w = 0, w1 = 1; y = 0 or a = 0 gives w = 1, w1 = 0. A NaN argument passes
-// the checks (ierr 0) and gives w = w1 = NaN.
+// x = 0 or b = 0 gives w = 0, w1 = 1; y = 0 or a = 0 gives w = 1, w1 = 0; a and b both below
+// 1e-18 give w = b/(a + b), w1 = a/(a + b). Otherwise a NaN argument passes the checks (ierr 0)
+// and gives w = w1 = NaN.
 //
-// Accuracy: about 1e-14 relative for both outputs over the whole domain, except where the value
-// itself is ill-conditioned in its inputs (very large a and b away from the mean, results near
-// the underflow threshold).
+// Accuracy: 1e-13 relative for both outputs, or 2^-51 times the value's condition number in its
+// inputs where that is larger (very large a and b away from the mean, far tails), down to values
+// near 1e-290. A shape below 1e-15 against x or y below about 1e-90 loses a little more, about
+// (tiny shape) * |ln min(x, y)| / 2: the published series for that case is of first order in the
+// tiny shape.
 //
 // Method: DiDonato & Morris, "Significant digit computation of the incomplete beta function
 // ratios", ACM TOMS 18 (1992) 360-373, Algorithm 708, with the IEEE double machine constants.

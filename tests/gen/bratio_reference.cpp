@@ -123,6 +123,15 @@ std::vector<Point> buildGrid() {
             }
         }
     }
+    // apser at extreme x: its first-order truncation in the tiny shape grows with |ln x|.
+    for (double tiny : {3e-16, 9e-16}) {
+        for (double other : {0.5, 50.0, 3e4}) {
+            for (double x : {1e-100, 1e-200, 1e-300}) {
+                points.push_back(makePoint("tiny_shape_far_tail", tiny, other, x));
+                points.push_back(makePointFromY("tiny_shape_far_tail", other, tiny, x));
+            }
+        }
+    }
     for (double x : {1e-5, 0.2, 0.5, 0.9}) {
         points.push_back(makePoint("tiny_shape", 1e-20, 3e-19, x));
         points.push_back(makePoint("tiny_shape", 2e-17, 1e-16, x));
