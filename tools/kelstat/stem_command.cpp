@@ -238,7 +238,7 @@ int runStemCommand(int argc, char** argv) {
     } else {
         std::fprintf(stderr,
                      "kelstat stem: the library refused the data (code %d): the display would "
-                     "need more than %d lines\n",
+                     "need more than %d lines, or the values are too extreme for any leaf unit\n",
                      static_cast<int>(code), KEL_STEMLEAF_MAX_LINES);
     }
     kel_DeleteStemAndLeafContainer(&display);
