@@ -98,49 +98,51 @@ void reduceToTridiagonal(matrix<double>& z, Vector& d, Vector& e) {
     }
 }
 
-// One QL sweep of the block l..m with rotations applied to the columns of z. p carries the
-// shifted value along the sweep; c and s are the last rotation's cosine and sine.
-void sweep(int l, int m, Vector& d, Vector& e, matrix<double>& z, double& c, double& s, double& p) {
+// State at the end of a QL sweep: the last rotation's cosine and sine and the carried value p.
+struct SweepEnd {
+    double cosine;
+    double sine;
+    double p;
+};
+
+// One QL sweep up the block l..m, the rotations applied to the columns of z as well.
+SweepEnd sweep(int l, int m, Vector& d, Vector& e, matrix<double>& z) {
     const int n = z.rowCount();
-    p = d[m];
-    c = 1.0;
-    s = 0.0;
+    double p = d[m];
+    double c = 1.0;
+    double s = 0.0;
     for (int i = m - 1; i >= l; --i) {
         double g = c * e[i];
         double h = c * p;
-        double cosine;
-        double sine;
         // The case split keeps the ratio below one in magnitude instead of calling a hypotenuse.
         if (compare(std::fabs(p), std::fabs(e[i])) == -1) {
             const double t = p / e[i];
             const double r = std::sqrt(t * t + 1.0);
             e[i + 1] = s * e[i] * r;
-            sine = 1.0 / r;
-            cosine = t * sine;
+            s = 1.0 / r;
+            c = t * s;
         } else {
             const double t = e[i] / p;
             const double r = std::sqrt(t * t + 1.0);
             e[i + 1] = s * p * r;
-            sine = t / r;
-            cosine = 1.0 / r;
+            s = t / r;
+            c = 1.0 / r;
         }
-        flushTiny(cosine);
+        flushTiny(c);
         flushTiny(d[i]);
-        flushTiny(sine);
+        flushTiny(s);
         flushTiny(g);
-        double nextP = cosine * d[i] - sine * g;
-        flushTiny(nextP);
+        p = c * d[i] - s * g;
+        flushTiny(p);
         flushTiny(h);
-        d[i + 1] = h + sine * (cosine * g + sine * d[i]);
+        d[i + 1] = h + s * (c * g + s * d[i]);
         for (int k = 0; k < n; ++k) {
             const double t = z(k, i + 1);
-            z(k, i + 1) = sine * z(k, i) + cosine * t;
-            z(k, i) = cosine * z(k, i) - sine * t;
+            z(k, i + 1) = s * z(k, i) + c * t;
+            z(k, i) = c * z(k, i) - s * t;
         }
-        c = cosine;
-        s = sine;
-        p = nextP;
     }
+    return {c, s, p};
 }
 
 // QL iteration on the tridiagonal matrix (d, e[1..n-1]), accumulating into z. Returns 0, or
@@ -165,18 +167,16 @@ int diagonaliseTridiagonal(Vector& d, Vector& e, matrix<double>& z) {
             do {
                 if (sweeps == kMaxSweepsPerEigenvalue) return l + 1;
                 const double g = d[l];
-                double p = (d[l + 1] - g) / (2.0 * e[l]);
-                double r = std::sqrt(p * p + 1.0);
+                const double p = (d[l + 1] - g) / (2.0 * e[l]);
+                const double r = std::sqrt(p * p + 1.0);
                 d[l] = e[l] / (p + mTransferSign(r, p));
                 const double shift = g - d[l];
                 for (int i = l + 1; i < n; ++i) d[i] -= shift;
                 shiftTotal += shift;
 
-                double c = 1.0;
-                double s = 0.0;
-                sweep(l, m, d, e, z, c, s, p);
-                e[l] = s * p;
-                d[l] = c * p;
+                const SweepEnd end = sweep(l, m, d, e, z);
+                e[l] = end.sine * end.p;
+                d[l] = end.cosine * end.p;
                 ++sweeps;
             } while (compare(std::fabs(e[l]), threshold) == 1);
         }

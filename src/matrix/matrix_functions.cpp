@@ -49,6 +49,21 @@ void flattenInto(const Matrix& a, std::vector<double>& out, int start, bool byRo
     }
 }
 
+template <class Square>
+double quadraticForm(const Square& a, const std::vector<double>& x) {
+    const int order = a.rowCount();
+    if (x.size() != static_cast<std::size_t>(order)) {
+        throw MatrixException("matrix::matrix and vector have incompatible dimensions");
+    }
+    double result = 0.0;
+    for (int i = 0; i < order; ++i) {
+        double row = 0.0;
+        for (int k = 0; k < order; ++k) row += a(i, k) * x[static_cast<std::size_t>(k)];
+        result += x[static_cast<std::size_t>(i)] * row;
+    }
+    return result;
+}
+
 // The factor of a from row 0 into factor; false, with factor emptied, when a is not positive
 // definite.
 bool factorFromFirstRow(const Smatrix<double>& a, UTmatrix<double>& factor) {
@@ -245,6 +260,17 @@ void KTimesColumnPlusVector(const matrix<double>& a, double k, int col, std::vec
     for (int row = 0; row < count; ++row) {
         v[static_cast<std::size_t>(row)] = v[static_cast<std::size_t>(row)] + k * a(row, col);
     }
+}
+
+double mQuadraticForm(const matrix<double>& a, const std::vector<double>& x) {
+    if (a.rowCount() != a.colCount()) {
+        throw MatrixException("matrix::quadratic form is only defined for square matrices");
+    }
+    return quadraticForm(a, x);
+}
+
+double mQuadraticForm(const Smatrix<double>& a, const std::vector<double>& x) {
+    return quadraticForm(a, x);
 }
 
 int mCompareWithFuzz(double a, double b, double /*unused*/, double relativeTolerance) {

@@ -56,6 +56,12 @@ void KTimesColumnPlusVector(const UTmatrix<double>& u, double k, int col, std::v
 void KTimesColumnPlusVector(const matrix<double>& a, double k, int col, std::vector<double>& v,
                             int count);
 
+// x' A x, as the dot product of x with A x. A dense a must be square ("matrix::quadratic form is
+// only defined for square matrices") and x must have one element per row ("matrix::matrix and
+// vector have incompatible dimensions"); order 0 gives 0.
+double mQuadraticForm(const matrix<double>& a, const std::vector<double>& x);
+double mQuadraticForm(const Smatrix<double>& a, const std::vector<double>& x);
+
 // Three-way comparison within a relative tolerance: 0 when |a - b| <= relativeTolerance *
 // max(|a|, |b|), else +1 when b is not greater than a (also for NaN) and -1 when it is. The third
 // argument is not used.

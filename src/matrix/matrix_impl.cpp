@@ -455,6 +455,11 @@ int matrix<T>::EigenSystems(std::vector<T>& values, matrix& vectors) const {
     return mEigenSystemsIterator(*this, values, vectors);
 }
 
+template <class T>
+T matrix<T>::mQuadraticForm(const std::vector<T>& x) const {
+    return matrix_library::mQuadraticForm(*this, x);
+}
+
 template class matrix<double>;
 template matrix<double> CreateRowVector(const std::vector<double>& elements);
 

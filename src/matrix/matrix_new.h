@@ -110,6 +110,8 @@ class matrix {
     void mFlattenMatrix(std::vector<T>& out, int start, bool byRows) const;
     // Eigenvalues ascending and unit eigenvectors in columns; see mEigenSystemsIterator.
     int EigenSystems(std::vector<T>& values, matrix& vectors) const;
+    // x' A x; see the free mQuadraticForm.
+    T mQuadraticForm(const std::vector<T>& x) const;
 
   private:
     void ResizeStorage(int rows, int cols, T value);
@@ -174,6 +176,7 @@ class Smatrix {
 
     bool CholeskyDecomp(UTmatrix<T>* factor) const;
     UTmatrix<T> mSmatrixToUTmatrix() const;
+    T mQuadraticForm(const std::vector<T>& x) const;
 
   private:
     static std::size_t packedIndex(int i, int j) {

@@ -189,6 +189,11 @@ UTmatrix<T> Smatrix<T>::mSmatrixToUTmatrix() const {
     return SmatrixToUTmatrix(*this);
 }
 
+template <class T>
+T Smatrix<T>::mQuadraticForm(const std::vector<T>& x) const {
+    return matrix_library::mQuadraticForm(*this, x);
+}
+
 template class Smatrix<double>;
 
 }  // namespace vek::matrix_library

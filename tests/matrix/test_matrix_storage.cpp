@@ -305,6 +305,21 @@ TEST(MatrixStorage, ArithmeticMembers) {
     EXPECT_EQ(other.size(), 6);
 }
 
+TEST(MatrixStorage, QuadraticForms) {
+    const matrix<double> a(Vector{2, 1, 1, 2}, 2);
+    EXPECT_EQ(a.mQuadraticForm(Vector{1, 2}), 14.0);
+    EXPECT_EQ(Smatrix<double>(a).mQuadraticForm(Vector{1, 2}), 14.0);
+    EXPECT_EQ(matrix<double>().mQuadraticForm(Vector{}), 0.0);
+    EXPECT_EQ(messageOf<MatrixException>([] {
+                  twoByThree().mQuadraticForm(Vector{1, 2, 3});
+              }),
+              "matrix::quadratic form is only defined for square matrices");
+    EXPECT_EQ(messageOf<MatrixException>([&] { a.mQuadraticForm(Vector{1}); }),
+              "matrix::matrix and vector have incompatible dimensions");
+    EXPECT_EQ(messageOf<MatrixException>([] { Smatrix<double>(2).mQuadraticForm(Vector{}); }),
+              "matrix::matrix and vector have incompatible dimensions");
+}
+
 TEST(MatrixStorage, SymmetricInsertAndRemoveKeepTheMapping) {
     // Rows (1 2 4), (2 3 5), (4 5 6).
     Smatrix<double> s(3);
