@@ -16,7 +16,8 @@ class ZRXRealFunction;
 // keep the relative test from ever holding) ends there with the current midpoint.
 //
 // With integerX set the answer is an integer: starting from floor of the lower interior point,
-// the first integer n at which f(n) > f(n + 1) no longer holds.
+// the first integer n at which f(n) > f(n + 1) no longer holds (a walk that finds none within a
+// fixed number of steps stops at the integer it has reached).
 double calcGoldenSection(double a, double b, ZRXRealFunction& f, bool integerX);
 
 }  // namespace kelstat

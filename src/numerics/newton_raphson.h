@@ -62,11 +62,14 @@ class NewtonRaphson {
     using SymmetricMatrix = vek::matrix_library::Smatrix<double>;
     using TriangularMatrix = vek::matrix_library::UTmatrix<double>;
 
+    // objective must not be null; its fixed points are read here. The step always solves
+    // negHessian * step = gradient; maximise only decides which value changes are improvements.
     NewtonRaphson(FunctionFirstNegSecondDerivative* objective, int n, bool maximise);
 
     // Runs the optimisation from the objective's starting estimates. theta receives the estimates
-    // (n of them, also on failure), covariance the inverse negative Hessian of order n. True
-    // exactly when the result code is 0.
+    // (n of them, also on failure), covariance the inverse negative Hessian of order n. After
+    // codes 9 to 11 no covariance is formed: it stays zero and the matrix code is 2. True exactly
+    // when the result code is 0.
     bool mCalculateOptimal(std::vector<double>& theta, SymmetricMatrix& covariance);
 
     void mSetMaximumNumberOfIterations(int iterations) { mMaximumIterations = iterations; }
@@ -82,7 +85,8 @@ class NewtonRaphson {
     int mGetEliminatedArgumentNumber() const { return mEliminatedArgument; }
     int mGetMaximumNumberOfIterations() const { return mMaximumIterations; }
     double mGetFunction() const { return mFunctionValue; }
-    // The ridge factors as adapted so far: the first is halved each time it repairs a step.
+    // The ridge factors as adapted so far: the first is halved whenever the first ridge attempt
+    // gives an acceptable step, until it is no longer above 1e-4.
     const std::vector<double>& mGetRidgeFactors() const { return mRidgeFactors; }
 
   protected:
@@ -94,23 +98,35 @@ class NewtonRaphson {
                                     const std::vector<double>& reference);
     void mCheckAlgorithmConverged(const std::vector<double>& theta, double referenceValue,
                                   const std::vector<double>& referenceEstimates);
+    // Counts worsenings from `reference` by more than 100 times its magnitude (1 below the small
+    // value); one by more than 10000 times reaches the limit of 4 at once.
     void mCheckDiverging(double reference);
 
     // Produces a step when the factorisation failed at column failIndex; theta is not consulted.
     void mMakeMatrixNonSingular(const std::vector<double>& theta,
                                 const std::vector<double>& savedTheta, std::vector<double>& step,
                                 const std::vector<int>& fixed, double pivot, int failIndex);
+    // Ridge-repairs the failed factor from `column` on; false when the order's worth of restarts
+    // could not complete it.
     bool mMakeAdjustment(int column, double pivot, double factor);
+    // Repairs a step that worsened the value or left the domain, then, outside fixed mode, moves
+    // to the parameter's fixed point when holding it there is at least as good.
     void mCheckCurrentStep(std::vector<double>& theta, double previousValue,
                            const std::vector<double>& savedTheta, std::vector<double>& step,
                            bool fixedMode, int failIndex, int parameterIndex, bool* stepOK,
                            bool* valid);
+    // Halves the step until the value is valid and not worse than previousValue; from the eighth
+    // check on, a value better than twice previousValue also ends the search.
     void mSearchForBetterStep(std::vector<double>& theta, double previousValue,
                               const std::vector<double>& savedTheta, std::vector<double>& step,
                               bool* valid);
+    // Newton step from savedTheta with `parameter` held at its fixed point; false when it has
+    // none or the reduced system cannot be solved.
     bool mCalcEstimatesAtFixedPoint(int parameter, const std::vector<double>& savedTheta,
                                     bool* valid, double* value,
                                     std::vector<double>& thetaAtFixedPoint);
+    // Covariance at theta and the matrix code; fixed parameters, or a singular column that has a
+    // fixed point, get zero rows and columns.
     void mCalculateInverseNegSecondDerivative(bool fixedMode, const std::vector<int>& fixed,
                                               const std::vector<double>& theta,
                                               SymmetricMatrix& covariance);
