@@ -8,6 +8,10 @@ namespace kelstat {
 
 class ZRXRealFunction;
 
+// Largest order findGaussianQuadratureWeights builds: its work grows as n^3 (about 10 s at this
+// order) and no caller needs more than a few hundred points.
+inline constexpr unsigned kMaxGaussLegendreOrder = 1024;
+
 // Appends the n/2 symmetric pairs of the n-point Gauss-Legendre rule: to nodes the negative node
 // of each pair, most negative first, and to weights the pair's common weight. Odd n loses its
 // middle node at 0. Nodes are the eigenvalues and weights 2 v0^2 from the first components of the
@@ -18,10 +22,6 @@ class ZRXRealFunction;
 // kMaxGaussLegendreOrder.
 bool findGaussianQuadratureWeights(unsigned n, std::vector<double>& nodes,
                                    std::vector<double>& weights);
-
-// Largest order findGaussianQuadratureWeights builds: its work grows as n^3 and its n x n matrix
-// as n^2, and no caller needs more than a few hundred points.
-inline constexpr unsigned kMaxGaussLegendreOrder = 2048;
 
 // Applies a symmetric rule to f on [a, b]: half * sum of w (f(mid + t) + f(mid - t)) with
 // t = node * half, pairs in list order and f(mid + t) evaluated first. Exactly two evaluations per
