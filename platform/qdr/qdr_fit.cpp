@@ -283,12 +283,16 @@ int fitExtremeValue(const double* data, unsigned int count, double* fit) {
             high = scale;
         }
         const double slope = -current.variance / (scale * scale) - 1.0;
-        double next = scale - residual / slope;
-        if (!(next > low && next < high)) {
+        // A Newton step below the tolerance ends the iteration before the bracket test: rounded
+        // onto the current point it would otherwise look like a step outside the bracket.
+        const double newtonStep = residual / slope;
+        const double tolerance = 4.0 * kEpsilon * scale;
+        const bool converged = std::fabs(newtonStep) <= tolerance;
+        double next = scale - newtonStep;
+        if (!converged && !(next > low && next < high)) {
             next = 0.5 * (low + high);
         }
-        const double tolerance = 4.0 * kEpsilon * next;
-        if (residual == 0.0 || std::fabs(next - scale) <= tolerance || high - low <= tolerance) {
+        if (converged || residual == 0.0 || high - low <= tolerance) {
             const WeightedMoments final = moments(next);
             const double location = uMax + next * std::log(final.weightSum / n);
             fit[0] = frame.centre + frame.spread * location;

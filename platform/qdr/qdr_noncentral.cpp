@@ -65,7 +65,8 @@ double oneDfCentralMass(double r, double mu) {
 // P(X <= r^2), each branch free of cancellation in its region.
 double oneDfLower(double r, double mu) {
     if (r >= mu) {
-        return normalLower(r - mu) - normalLower(-r - mu);
+        // Two nonnegative error functions: no cancellation even where both tails are near 1/2.
+        return 0.5 * (std::erf((r - mu) * M_SQRT1_2) + std::erf((r + mu) * M_SQRT1_2));
     }
     if (r * mu >= kOneDfDifferenceLimit) {
         return normalUpper(mu - r) - normalUpper(mu + r);
@@ -99,13 +100,11 @@ constexpr double kGridStepScale = 0.6;
 constexpr std::size_t kMaxGridPoints = 40000;
 
 // Beyond this noncentrality the series behind the fallback would be too long to run.
-constexpr double kMaxFallbackNoncentrality = 1000.0;
+constexpr double kMaxFallbackNoncentrality = 5000.0;
 
-// Bracket expansion doubles its step; 200 doublings cover any double.
-constexpr int kMaxBracketSteps = 200;
-
-// Newton steps with bisection fallback; convergence takes 3-6 steps from the start below.
-constexpr int kTMaxIterations = 200;
+// Newton steps with bisection fallback; convergence takes 3-6 steps from the start below, and
+// the doubling step limit reaches any double within a few hundred.
+constexpr int kTMaxIterations = 400;
 
 // The boundary iteration for the grid range converges in a handful of steps; exactness is not
 // needed there.
@@ -263,11 +262,16 @@ double chiSquareOneDfQuantile(double p, double lambda) {
         if (halleyFactor > 0.5) {
             step /= halleyFactor;
         }
+        // Converged steps are tested before the bracket: rounded onto r they would look like a
+        // step outside it.
+        if (std::fabs(step) <= 2.0 * kEpsilon * r) {
+            return (r - step) * (r - step);
+        }
         double next = r - step;
         if (!(next > low && next < high)) {
             next = 0.5 * (low + high);
         }
-        if (std::fabs(next - r) <= 2.0 * kEpsilon * next || high - low <= 2.0 * kEpsilon * high) {
+        if (high - low <= 2.0 * kEpsilon * high) {
             return next * next;
         }
         r = next;
@@ -295,35 +299,12 @@ double noncentralTQuantile(double p, double df, double ncp) {
     if (!std::isfinite(t) || std::isnan(residual)) {
         return kNaN;
     }
-    // Bracket the root by doubling steps away from the start.
-    double low = t;
-    double high = t;
-    double lowResidual = residual;
-    double highResidual = residual;
-    double width = std::max(1.0, 0.1 * std::fabs(t));
-    for (int i = 0; i < kMaxBracketSteps && lowResidual > 0.0; ++i) {
-        high = low;
-        highResidual = lowResidual;
-        low -= width;
-        width *= 2.0;
-        double unused = 0.0;
-        lowResidual = residualAt(low, &unused);
-    }
-    for (int i = 0; i < kMaxBracketSteps && highResidual < 0.0; ++i) {
-        low = high;
-        lowResidual = highResidual;
-        high += width;
-        width *= 2.0;
-        double unused = 0.0;
-        highResidual = residualAt(high, &unused);
-    }
-    if (!(lowResidual <= 0.0 && highResidual >= 0.0)) {
-        return kNaN;
-    }
-    if (!(t >= low && t <= high)) {
-        t = 0.5 * (low + high);
-        residual = residualAt(t, &slope);
-    }
+    // Newton from the start. Until a residual of each sign has been seen, a step may not exceed
+    // a width that doubles each time it binds, so a poor start in a flat tail cannot throw the
+    // iterate away; once bracketed, steps leaving the bracket are replaced by bisection.
+    double low = -kInfinity;
+    double high = kInfinity;
+    double maxStep = std::max(1.0, 0.1 * std::fabs(t));
     for (int iteration = 0; iteration < kTMaxIterations; ++iteration) {
         if (residual == 0.0) {
             return t;
@@ -333,16 +314,28 @@ double noncentralTQuantile(double p, double df, double ncp) {
         } else {
             high = t;
         }
-        double next = slope > 0.0 ? t - residual / slope : 0.5 * (low + high);
-        if (!(next > low && next < high)) {
+        const bool bracketed = std::isfinite(low) && std::isfinite(high);
+        double step = slope > 0.0 ? residual / slope : kInfinity;
+        if (!bracketed && !(std::fabs(step) <= maxStep)) {
+            step = residual > 0.0 ? maxStep : -maxStep;
+            maxStep *= 2.0;
+        }
+        const double tolerance = 2.0 * kEpsilon * std::fabs(t);
+        if (std::fabs(step) <= tolerance) {
+            return t - step;
+        }
+        double next = t - step;
+        if (bracketed && !(next > low && next < high)) {
             next = 0.5 * (low + high);
         }
-        const double tolerance = 2.0 * kEpsilon * std::fabs(next);
-        if (std::fabs(next - t) <= tolerance || high - low <= tolerance) {
+        if (bracketed && high - low <= tolerance) {
             return next;
         }
         t = next;
         residual = residualAt(t, &slope);
+        if (std::isnan(residual)) {
+            return kNaN;
+        }
     }
     return kNaN;
 }
