@@ -33,56 +33,53 @@ void flushTiny(double& value) {
     if (compare(std::fabs(value), kMachineEpsilon) == -1) value = 0.0;
 }
 
-// Householder reduction of the symmetric matrix held in the lower triangle of z to tridiagonal
-// form: d receives the diagonal, e the subdiagonal in e[1..n-1], and z the orthogonal matrix of
-// the accumulated transformations.
-void reduceToTridiagonal(matrix<double>& z, Vector& d, Vector& e) {
+// Householder reflection that clears row i of z left of its subdiagonal (i >= 2). Stores the
+// reflection's vector in row i and its scaled copy in column i, the new subdiagonal element in
+// e[i], updates the leading i x i block, and returns the reflection's h (0 when the row is
+// already zero within the fuzz).
+double reflectRow(matrix<double>& z, Vector& e, int i) {
+    const int l = i - 1;
+    double scale = 0.0;
+    for (int k = 0; k <= l; ++k) scale += std::fabs(z(i, k));
+    if (isFuzzyZero(scale)) {
+        e[i] = z(i, l);
+        return 0.0;
+    }
+    double h = 0.0;
+    for (int k = 0; k <= l; ++k) {
+        z(i, k) /= scale;
+        h += z(i, k) * z(i, k);
+    }
+    double f = z(i, l);
+    double g = -mTransferSign(std::sqrt(h), f);
+    e[i] = scale * g;
+    h -= f * g;
+    z(i, l) = f - g;
+    // p = A u / h into e[0..l], and f = u'p.
+    f = 0.0;
+    for (int j = 0; j <= l; ++j) {
+        z(j, i) = z(i, j) / h;
+        g = 0.0;
+        for (int k = 0; k <= j; ++k) g += z(j, k) * z(i, k);
+        for (int k = j + 1; k <= l; ++k) g += z(k, j) * z(i, k);
+        e[j] = g / h;
+        f += e[j] * z(i, j);
+    }
+    // A - q u' - u q' with q = p - (u'p / 2h) u, lower triangle only.
+    const double hh = f / (h + h);
+    for (int j = 0; j <= l; ++j) {
+        f = z(i, j);
+        g = e[j] - hh * f;
+        e[j] = g;
+        for (int k = 0; k <= j; ++k) z(j, k) = z(j, k) - f * e[k] - g * z(i, k);
+    }
+    return h;
+}
+
+// Forms in z the product of the reflections stored by reflectRow; d[i] holds reflection i's h on
+// entry and the tridiagonal matrix's diagonal on return.
+void accumulateReflections(matrix<double>& z, Vector& d) {
     const int n = z.rowCount();
-    for (int i = n - 1; i >= 1; --i) {
-        const int l = i - 1;
-        double h = 0.0;
-        if (i >= 2) {
-            double scale = 0.0;
-            for (int k = 0; k <= l; ++k) scale += std::fabs(z(i, k));
-            if (isFuzzyZero(scale)) {
-                e[i] = z(i, l);
-            } else {
-                for (int k = 0; k <= l; ++k) {
-                    z(i, k) /= scale;
-                    h += z(i, k) * z(i, k);
-                }
-                double f = z(i, l);
-                double g = -mTransferSign(std::sqrt(h), f);
-                e[i] = scale * g;
-                h -= f * g;
-                z(i, l) = f - g;
-                f = 0.0;
-                for (int j = 0; j <= l; ++j) {
-                    z(j, i) = z(i, j) / h;
-                    g = 0.0;
-                    for (int k = 0; k <= j; ++k) g += z(j, k) * z(i, k);
-                    for (int k = j + 1; k <= l; ++k) g += z(k, j) * z(i, k);
-                    e[j] = g / h;
-                    f += e[j] * z(i, j);
-                }
-                const double hh = f / (h + h);
-                for (int j = 0; j <= l; ++j) {
-                    f = z(i, j);
-                    g = e[j] - hh * f;
-                    e[j] = g;
-                    for (int k = 0; k <= j; ++k) z(j, k) = z(j, k) - f * e[k] - g * z(i, k);
-                }
-            }
-        } else {
-            e[i] = z(i, l);
-        }
-        d[i] = h;
-    }
-    if (n > 0) {
-        d[0] = 0.0;
-        e[0] = 0.0;
-    }
-    // Accumulate the transformations; d[i] still holds the i-th reflection's h.
     for (int i = 0; i < n; ++i) {
         const int l = i - 1;
         if (i > 0 && !isFuzzyZero(d[i])) {
@@ -96,6 +93,25 @@ void reduceToTridiagonal(matrix<double>& z, Vector& d, Vector& e) {
         z(i, i) = 1.0;
         for (int j = 0; j <= l; ++j) z(j, i) = z(i, j) = 0.0;
     }
+}
+
+// Householder reduction of the symmetric matrix held in the lower triangle of z to tridiagonal
+// form: d receives the diagonal, e the subdiagonal in e[1..n-1], and z the orthogonal matrix of
+// the accumulated transformations.
+void reduceToTridiagonal(matrix<double>& z, Vector& d, Vector& e) {
+    const int n = z.rowCount();
+    if (n == 0) return;
+    for (int i = n - 1; i >= 1; --i) {
+        if (i >= 2) {
+            d[i] = reflectRow(z, e, i);
+        } else {
+            e[i] = z(i, i - 1);
+            d[i] = 0.0;
+        }
+    }
+    d[0] = 0.0;
+    e[0] = 0.0;
+    accumulateReflections(z, d);
 }
 
 // State at the end of a QL sweep: the last rotation's cosine and sine and the carried value p.
