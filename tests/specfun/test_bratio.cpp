@@ -16,6 +16,7 @@
 #include <vector>
 
 #include "specfun/bratio.h"
+#include "specfun/bratio_table.h"
 
 namespace kelstat {
 namespace {
@@ -286,6 +287,39 @@ TEST(BratioAuxiliary, MachineConstantsAreIeeeDouble) {
     for (int i = 1; i <= 10; ++i) EXPECT_EQ(ipmpar(i), expected[i - 1]) << i;
     EXPECT_EQ(ipmpar(0), 0);
     EXPECT_EQ(ipmpar(11), 0);
+}
+
+// The published listing numbers each set from the highest power down; the table holds it by
+// power, constant term first, with the leading 1 of some denominators added.
+TEST(BratioAuxiliary, ErrorFunctionTableMatchesSecondTranscription) {
+    std::ifstream in(std::string(KELSTAT_TEST_DATA_DIR) + "/bratio_erf_coefficients.csv");
+    ASSERT_TRUE(in.good());
+    const std::map<std::string, std::vector<double>> table = {
+        {"A", {std::begin(erf_table::kSmallNumerator), std::end(erf_table::kSmallNumerator)}},
+        {"B", {std::begin(erf_table::kSmallDenominator), std::end(erf_table::kSmallDenominator)}},
+        {"P", {std::begin(erf_table::kMidNumerator), std::end(erf_table::kMidNumerator)}},
+        {"Q", {std::begin(erf_table::kMidDenominator), std::end(erf_table::kMidDenominator)}},
+        {"R", {std::begin(erf_table::kLargeNumerator), std::end(erf_table::kLargeNumerator)}},
+        {"S", {std::begin(erf_table::kLargeDenominator), std::end(erf_table::kLargeDenominator)}},
+    };
+    int compared = 0;
+    std::string line;
+    while (std::getline(in, line)) {
+        if (line.empty() || line[0] == '#' || line.rfind("set,", 0) == 0) continue;
+        std::istringstream fields(line);
+        std::string set, index, value;
+        std::getline(fields, set, ',');
+        std::getline(fields, index, ',');
+        std::getline(fields, value, ',');
+        std::replace(value.begin(), value.end(), 'D', 'e');
+        const std::vector<double>& coefficients = table.at(set);
+        const std::size_t position = coefficients.size() - std::stoul(index);
+        EXPECT_EQ(coefficients[position], std::strtod(value.c_str(), nullptr)) << set << index;
+        ++compared;
+    }
+    EXPECT_EQ(compared, 33);
+    EXPECT_EQ(erf_table::kSmallDenominator[0], 1.0);
+    EXPECT_EQ(erf_table::kLargeDenominator[0], 1.0);
 }
 
 TEST(BratioAuxiliary, ErrorFunctionsMatchBoostOnEveryRange) {
