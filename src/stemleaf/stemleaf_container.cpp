@@ -56,20 +56,27 @@ bool allMultiplesOfTen(const LeafQuotients& values, std::int64_t from, std::int6
 }
 
 // The leaves of the values [from, to): each quotient's distance from the stem's base. False when
-// the column is out of order (or holds NaN) anywhere from column[from - 1] to column[to - 1].
-// Works in blocks that stay in the first-level cache between the order check and the leaves; the
-// leaf loop is plain code that the compiler vectorises, division and truncation included.
-bool fillLeavesOfOrderedColumn(const double* column, double leafUnit, std::int64_t from,
-                               std::int64_t to, std::int32_t stemInLeafUnits,
+// the column is out of order (or holds NaN) anywhere from column[from - 1] to column[to - 1], or
+// rises above its last value there.
+//
+// Works in blocks that stay in the first-level cache between the order check and the leaves.
+// Once a block is known to be ascending, NaN-free and within the column's ends, whose quotients
+// are not saturated, every quotient in it lies strictly inside the limits: Q needs neither its
+// NaN case nor its clamp, and the plain loop vectorises well (same operations, same order, so
+// the same bits).
+bool fillLeavesOfOrderedColumn(const double* column, std::uint32_t n, double leafUnit,
+                               std::int64_t from, std::int64_t to, std::int32_t stemInLeafUnits,
                                std::int32_t* leaves) {
+    const double last = column[n - 1];
     for (std::int64_t start = from; start < to; start += kLeafBlock) {
         const std::int64_t end = std::min(to, start + kLeafBlock);
         const auto checkFrom = static_cast<std::size_t>(std::max<std::int64_t>(start, 1));
         if (!isAscendingRun(column, checkFrom, static_cast<std::size_t>(end))) return false;
+        if (!(column[end - 1] <= last)) return false;
         std::int32_t* out = leaves + (start - from);
         for (std::int64_t i = start; i < end; ++i) {
-            *out++ =
-                std::abs(getIntegerEqualOrNextCloserToZero(column[i] / leafUnit) - stemInLeafUnits);
+            const double quotient = column[i] / leafUnit * kQuotientFuzz;
+            *out++ = std::abs(static_cast<std::int32_t>(quotient) - stemInLeafUnits);
         }
     }
     return true;
@@ -253,7 +260,7 @@ std::int32_t runStemAndLeaf(const double* column, std::uint32_t n,
         if (next > position) {
             auto* leaves = new std::int32_t[static_cast<std::size_t>(next - position)];
             line.leaves = leaves;
-            if (!fillLeavesOfOrderedColumn(column, leafUnit, position, next,
+            if (!fillLeavesOfOrderedColumn(column, n, leafUnit, position, next,
                                            static_cast<std::int32_t>(stem * 10), leaves)) {
                 return KEL_STEMLEAF_INVALID_INPUT;
             }

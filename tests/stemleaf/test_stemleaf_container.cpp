@@ -301,6 +301,20 @@ TEST(StemLeafBadInput, RefusedRunsWriteNothing) {
     EXPECT_EQ(kel_RunStemAndLeaf(sorted, 3, &good, nullptr), KEL_STEMLEAF_INVALID_INPUT);
 }
 
+TEST(StemLeafBadInput, ValueBeyondTheLastOneEarlyInTheColumn) {
+    // The first leaf block ends on a value far beyond the column's last value (its quotient would
+    // not fit in 32 bits); the drop after it is only seen with the next block.
+    std::vector<double> column(5000);
+    for (std::size_t i = 0; i < column.size(); ++i) column[i] = static_cast<double>(i);
+    column[2047] = 5e9;
+    const kel_StemAndLeafScaleInfo scale = fixedScale(1, 10);
+    kel_StemAndLeaf container = sentinelContainer();
+    const kel_StemAndLeaf before = container;
+    EXPECT_EQ(kel_RunStemAndLeaf(column.data(), 5000, &scale, &container),
+              KEL_STEMLEAF_INVALID_INPUT);
+    EXPECT_EQ(std::memcmp(&container, &before, sizeof container), 0);
+}
+
 TEST(StemLeafBadInput, SecondRunLeavesTheFirstDisplayIntact) {
     const std::vector<double> data = {-23, -15, -8, -2, 0, 3, 7, 12, 18, 25, 31, 44};
     const kel_StemAndLeafScaleInfo scale = fixedScale(1, 10);
