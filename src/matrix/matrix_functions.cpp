@@ -273,13 +273,4 @@ double mQuadraticForm(const Smatrix<double>& a, const std::vector<double>& x) {
     return quadraticForm(a, x);
 }
 
-int mCompareWithFuzz(double a, double b, double /*unused*/, double relativeTolerance) {
-    if (std::fabs(a - b) <= relativeTolerance * std::max(std::fabs(a), std::fabs(b))) return 0;
-    return b > a ? -1 : 1;
-}
-
-double mTransferSign(double a, double b) {
-    return std::copysign(std::fabs(a), b);
-}
-
 }  // namespace vek::matrix_library

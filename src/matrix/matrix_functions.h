@@ -4,6 +4,8 @@
 #ifndef KELSTAT_MATRIX_MATRIX_FUNCTIONS_H
 #define KELSTAT_MATRIX_MATRIX_FUNCTIONS_H
 
+#include <algorithm>
+#include <cmath>
 #include <vector>
 
 #include "matrix/matrix_new.h"
@@ -65,9 +67,15 @@ double mQuadraticForm(const Smatrix<double>& a, const std::vector<double>& x);
 // Three-way comparison within a relative tolerance: 0 when |a - b| <= relativeTolerance *
 // max(|a|, |b|), else +1 when b is not greater than a (also for NaN) and -1 when it is. The third
 // argument is not used.
-int mCompareWithFuzz(double a, double b, double unused, double relativeTolerance);
+// Inline: the eigen-system iteration calls it several times per rotation.
+inline int mCompareWithFuzz(double a, double b, double /*unused*/, double relativeTolerance) {
+    if (std::fabs(a - b) <= relativeTolerance * std::max(std::fabs(a), std::fabs(b))) return 0;
+    return b > a ? -1 : 1;
+}
 // |a| carrying the sign bit of b (-0.0 counts as negative).
-double mTransferSign(double a, double b);
+inline double mTransferSign(double a, double b) {
+    return std::copysign(std::fabs(a), b);
+}
 
 }  // namespace vek::matrix_library
 
