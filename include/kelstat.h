@@ -177,15 +177,33 @@ KELSTAT_API void kel_DeleteStemAndLeafContainer(kel_StemAndLeaf** container);
 
 /* ---------------------------------------------------------------------------------------------
  * Tolerance intervals.
+ *
+ * A tolerance interval contains, with confidence confidenceLevel, at least the fraction
+ * proportion of the population the sample came from. Two-sided requests give both limits;
+ * one-sided requests give a lower or an upper tolerance bound.
+ *
+ * Units: confidenceLevel and proportion are fractions (0.95, not 95); the nonparametric
+ * achievedConfidence is in percent (0 to 100).
+ *
+ * Neither function validates its inputs beyond what is written below: a confidence level or
+ * proportion outside (0, 1) reaches the distribution functions unchanged and normally yields NaN
+ * results. Results that cannot be computed are quiet NaN (0x7FF8000000000000); a NaN result is
+ * never turned into an error code.
+ *
+ * Thread safety: every call works on its own copy of the data; calls on different records may
+ * run concurrently. Nothing is kept between calls. No exception is caught: memory exhaustion
+ * passes to the caller.
  * ------------------------------------------------------------------------------------------- */
 
-/** Which limits are wanted (signed 32-bit). */
+/** Which limits are wanted (signed 32-bit). Any other value gives NaN K-factors and limits from
+ *  the parametric function (estimates are still set). */
 typedef int32_t kel_ConfidenceType;
-#define kel_LowerBound ((kel_ConfidenceType)-1)
-#define kel_TwoSided ((kel_ConfidenceType)0)
-#define kel_UpperBound ((kel_ConfidenceType)1)
+#define kel_LowerBound ((kel_ConfidenceType)-1) /* lower tolerance bound only */
+#define kel_TwoSided ((kel_ConfidenceType)0)    /* both limits                */
+#define kel_UpperBound ((kel_ConfidenceType)1)  /* upper tolerance bound only */
 
-/** Distribution codes of kel_ParametricTIData.distribution; any other value selects normal. */
+/** Distribution codes of kel_ParametricTIData.distribution. The field is compared as unsigned,
+ *  so every value above 8 (also one a caller thinks of as negative) selects the normal model. */
 enum {
     KEL_DIST_NORMAL = 0,
     KEL_DIST_LOGNORMAL = 1,
@@ -224,11 +242,63 @@ typedef struct kel_NonParametricTIData {
     double achievedConfidence; /* out: percent                                        */
 } kel_NonParametricTIData;
 
-/** Tolerance interval or bound under a distribution model. */
+/**
+ * Tolerance interval or bound for data[0..count-1] under the model tiData->distribution.
+ *
+ * The caller fills distribution, confidenceType, confidenceLevel and proportion. The library
+ * copies the observations, estimates the model's parameters, computes the K-factor(s) and forms
+ * the limits location -/+ K x scale on the model's scale, mapped back to the data's scale:
+ *   normal (0, and every code above 8): location = sample mean, scale = standard deviation
+ *       (divisor n - 1). One-sided K from the noncentral t quantile; two-sided K the exact
+ *       factor (coverage confidence integrated by 36-point Gauss-Legendre quadrature over
+ *       [0, 8.3] standard errors, solved for K);
+ *   lognormal (1): the normal model on natural logarithms, limits exponentiated; location and
+ *       scale are the mean and standard deviation of the logarithms. Observations <= 0 are not
+ *       screened (their logarithms, -inf or NaN, flow into the results);
+ *   gamma (2): the normal model on cube roots (Wilson-Hilferty), limits cubed; location = the
+ *       maximum-likelihood gamma shape, scale = the gamma scale; both NaN when every observation
+ *       is equal. The code is that of the gamma fit (below);
+ *   3 to 8 (Weibull, smallest and largest extreme value, exponential, log-logistic, logistic):
+ *       not available in this version: every output NaN, code 0.
+ *
+ * Written, whatever the code: location, scale, lowerLimit, upperLimit, lowerKFactor,
+ * upperKFactor, auxiliary[0..1]. For a one-sided request both limit fields hold the one bound
+ * asked for, and the other K-factor is NaN; for a confidenceType outside -1..1 both K-factors and
+ * both limits are NaN and the estimates are still set. auxiliary is NaN for every model
+ * available here. With fewer than two observations, K-factors and limits are NaN (and with none,
+ * the estimates as well).
+ *
+ * Returns 0, or for the gamma model the code of its maximum-likelihood fit passed on unchanged:
+ *   1 fewer than two observations, 2 a non-finite or non-positive observation, 3 all
+ *   observations equal, 4 no convergence, 5 invalid argument.
+ * A non-zero code does not stop the computation: K-factors and limits are still formed and
+ * written; the caller decides what the code means.
+ *
+ * A NULL tiData returns 0 and writes nothing. A NULL data pointer is treated as count = 0.
+ */
 KELSTAT_API int32_t kel_CalcParametricToleranceInterval(const double* data, uint32_t count,
                                                         kel_ParametricTIData* tiData);
 
-/** Nonparametric tolerance interval or bound from the sorted sample. */
+/**
+ * Distribution-free tolerance interval or bound from order statistics of data[0..count-1],
+ * which the caller sorts ascending (the library never sorts; on unsorted data the elements at the
+ * chosen positions are returned).
+ *
+ * The caller fills confidenceType, confidenceLevel and proportion; the 4-byte gap at offset 4 is
+ * neither read nor written. Two order statistics X(r) <= X(s) are chosen, the indices found from
+ * the incomplete beta function:
+ *   kel_TwoSided: (X(r), X(s)) covers at least the proportion with at least the confidence
+ *       when the sample is large enough; otherwise the widest interval, (minimum, maximum);
+ *   any other value (one-sided): lowerLimit = X(r) is the lower bound and upperLimit = X(n+1-r)
+ *       the matching upper bound at the same confidence; the caller reads the one it wants.
+ * achievedConfidence is the confidence (percent) that the chosen order statistics actually reach,
+ * usually above the request, and far below it when the sample is too small for the request.
+ *
+ * Writes lowerLimit, upperLimit and achievedConfidence and returns 0. With count < 2 (or above
+ * 2 147 000 000) all three are NaN. A confidence level of exactly 0 (one-sided) gives NaN limits.
+ *
+ * A NULL tiData returns 0 and writes nothing. A NULL data pointer is treated as count = 0.
+ */
 KELSTAT_API int32_t kel_CalcNonParametricToleranceInterval(const double* data, uint32_t count,
                                                            kel_NonParametricTIData* tiData);
 
