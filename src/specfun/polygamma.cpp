@@ -180,9 +180,12 @@ Status expandAndRecur(double x, double logX, int n, int kode, int count, double 
 
     double order = static_cast<double>(n) + static_cast<double>(count - 1);
     const double logScale = order * logShifted;
+    // Amos also counts 1/x^2, the step of the expansion, which makes the published routine
+    // report -psi itself as underflowed for x above about 1e152; for order 0 an underflowing
+    // 1/x^2 only drops terms that are negligible anyway, so the digamma member is exempt.
     const double largestExponent = std::max(
         {std::fabs(logScale), std::fabs(2.0 * logShifted), std::fabs(logScale + logShifted)});
-    if (largestExponent > kExponentLimit) return Status::highestUnderflows;
+    if (largestExponent > kExponentLimit && order != 0.0) return Status::highestUnderflows;
 
     double scale = std::pow(shifted, -order);  // not exp(-logScale): no error growth with order
     const double halfReciprocal = 0.5 / shifted;
@@ -247,11 +250,13 @@ void XDPSIFN(double x, int n, int kode, int m, double* ans, int* nz, int* ierr) 
 
     const double logX = std::log(x);
     // Members whose order makes the result underflow are zeroed from the top down, until the
-    // highest remaining one is representable.
+    // highest remaining one is representable. The digamma member alone (order 0, about -ln x)
+    // never underflows, so it is exempt.
     for (int count = m; count > 0; --count) {
         const double highestOrder = static_cast<double>(n) + static_cast<double>(count - 1);
         const double logMagnitude = (highestOrder + 1.0) * logX;
-        if (std::fabs(logMagnitude) > kExponentLimit) {
+        const bool digammaOnly = highestOrder == 0.0;
+        if (std::fabs(logMagnitude) > kExponentLimit && !(digammaOnly && logMagnitude > 0.0)) {
             if (logMagnitude <= 0.0) {
                 *nz = 0;
                 *ierr = kOverflow;

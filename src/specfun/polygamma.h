@@ -12,8 +12,9 @@ namespace kelstat {
 // where psi^(j) is the j-th derivative of the digamma function (psi^(0) = psi).
 // So with n = 0, kode = 1, m = 1, ans[0] = -psi(x).
 //
-// ierr = 0: computed; nz > 0 then says that the last nz members underflowed and were set to 0
-//           (for n = 0 and x above about 1e304 this includes -psi itself).
+// ierr = 0: computed; nz > 0 then says that the last nz members underflowed and were set to 0.
+//           Departure from the published routine: the member -psi(x) (n = 0) is always
+//           computed, where Amos's exponent tests would report it underflowed for x > ~1e152.
 // ierr = 1: bad argument (x <= 0, n < 0, kode not 1 or 2, m < 1); ans is not written, except
 //           that a NaN x sets all m members to NaN.
 // ierr = 2: overflow, x too small for the order n + m - 1; nz = 0.
@@ -25,7 +26,8 @@ namespace kelstat {
 void XDPSIFN(double x, int n, int kode, int m, double* ans, int* nz, int* ierr);
 
 // Digamma function psi(x) = d/dx ln Gamma(x) for x > 0, taken as -ans[0] of
-// XDPSIFN(x, 0, 1, 1, ...), whose flags are not examined: 0 for x <= 0, NaN for NaN.
+// XDPSIFN(x, 0, 1, 1, ...), whose flags are not examined: 0 for x <= 0, NaN for NaN, +inf for
+// +inf.
 // Accuracy: within a few ulps, except near the positive root 1.4616... where the relative
 // error grows as the value passes through 0.
 double psi(double x);
