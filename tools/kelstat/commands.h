@@ -11,6 +11,7 @@ constexpr int kExitRefused = 1;
 constexpr int kExitUsage = 2;
 
 int runStemCommand(int argc, char** argv);
+int runTiCommand(int argc, char** argv);
 
 }  // namespace kelstat::cli
 

@@ -16,6 +16,7 @@ struct Command {
 
 constexpr Command kCommands[] = {
     {"stem", "stem-and-leaf display of a column of numbers", kelstat::cli::runStemCommand},
+    {"ti", "tolerance interval or bound of a sample", kelstat::cli::runTiCommand},
 };
 
 void printUsage(std::FILE* out) {

@@ -1,0 +1,429 @@
+// kelstat ti: reads a sample, asks the library for a tolerance interval or bound under one model
+// (or under every available model side by side), and prints the estimates, K-factors, limits and
+// result code as text or JSON.
+#include <algorithm>
+#include <cmath>
+#include <cstdint>
+#include <cstdio>
+#include <cstdlib>
+#include <limits>
+#include <string>
+#include <vector>
+
+#include "commands.h"
+#include "kelstat.h"
+#include "read_numbers.h"
+
+namespace kelstat::cli {
+namespace {
+
+constexpr int kNonParametric = -1;  // not a distribution code: the order-statistic method
+
+// Every method the tool knows. A family the library does not compute yet stays listed but off;
+// switching it on is changing its `available` flag.
+struct ModelEntry {
+    const char* name;
+    const char* title;
+    int distribution;
+    bool available;
+};
+
+constexpr ModelEntry kModels[] = {
+    {"normal", "normal", KEL_DIST_NORMAL, true},
+    {"lognormal", "lognormal", KEL_DIST_LOGNORMAL, true},
+    {"gamma", "gamma", KEL_DIST_GAMMA, true},
+    {"weibull", "Weibull", KEL_DIST_WEIBULL, false},
+    {"sev", "smallest extreme value", KEL_DIST_SMALLEST_EXTREME_VALUE, false},
+    {"lev", "largest extreme value", KEL_DIST_LARGEST_EXTREME_VALUE, false},
+    {"exponential", "exponential", KEL_DIST_EXPONENTIAL, false},
+    {"loglogistic", "log-logistic", KEL_DIST_LOGLOGISTIC, false},
+    {"logistic", "logistic", KEL_DIST_LOGISTIC, false},
+    {"nonparametric", "nonparametric", kNonParametric, true},
+};
+
+struct TiOptions {
+    std::string path;
+    std::string model = "normal";
+    double confidence = 0.95;
+    double proportion = 0.90;
+    kel_ConfidenceType sided = kel_TwoSided;
+    bool json = false;
+};
+
+// What one method gives back, whichever entry point computed it.
+struct TiResult {
+    const ModelEntry* model = nullptr;
+    int32_t code = 0;
+    double location = std::numeric_limits<double>::quiet_NaN();
+    double scale = std::numeric_limits<double>::quiet_NaN();
+    double lowerKFactor = std::numeric_limits<double>::quiet_NaN();
+    double upperKFactor = std::numeric_limits<double>::quiet_NaN();
+    double lowerLimit = std::numeric_limits<double>::quiet_NaN();
+    double upperLimit = std::numeric_limits<double>::quiet_NaN();
+    double achievedConfidence = std::numeric_limits<double>::quiet_NaN();
+};
+
+std::string availableModelNames() {
+    std::string names;
+    for (const ModelEntry& model : kModels) {
+        if (!model.available) continue;
+        if (!names.empty()) names += ", ";
+        names += model.name;
+    }
+    return names;
+}
+
+void printTiUsage(std::FILE* out) {
+    std::fprintf(
+        out,
+        "usage: kelstat ti [--model M] [--confidence C] [--proportion P]\n"
+        "                  [--sided two|lower|upper] [--json] [FILE]\n"
+        "\n"
+        "Computes a tolerance interval: limits that contain at least the proportion P\n"
+        "of the population with confidence C, from the numbers in FILE (standard input\n"
+        "when FILE is missing or '-'). Numbers are separated by white space, commas or\n"
+        "new lines.\n"
+        "\n"
+        "options:\n"
+        "  --model M       %s, or all (every method side\n"
+        "                  by side); default normal\n"
+        "  --confidence C  confidence level, a fraction in (0, 1); default 0.95\n"
+        "  --proportion P  proportion of the population to cover, in (0, 1); default 0.90\n"
+        "  --sided S       two (interval, the default), lower or upper (one bound)\n"
+        "  --json          machine-readable output (NaN is written as null)\n"
+        "  --help          show this help\n"
+        "\n"
+        "The nonparametric method uses order statistics of the sorted sample and reports\n"
+        "the confidence they actually achieve; it needs enough observations for the\n"
+        "request (59 for a 95 %%/95 %% one-sided bound, 93 for an interval).\n"
+        "Exit status: 0 success, 1 the model's fit reported a problem (results are\n"
+        "still shown), 2 bad arguments or input.\n",
+        availableModelNames().c_str());
+}
+
+const char* codeMeaning(int32_t code) {
+    switch (code) {
+        case 0:
+            return "success";
+        case 1:
+            return "fit: fewer than two observations";
+        case 2:
+            return "fit: an observation is not finite or outside the distribution's support";
+        case 3:
+            return "fit: all observations are equal";
+        case 4:
+            return "fit: did not converge";
+        case 5:
+            return "fit: invalid argument";
+        default:
+            return "unknown code";
+    }
+}
+
+const char* sidedName(kel_ConfidenceType sided) {
+    return sided == kel_TwoSided ? "two-sided" : sided == kel_LowerBound ? "lower" : "upper";
+}
+
+// A fraction strictly between 0 and 1, or false.
+bool parseFraction(const std::string& text, double& value) {
+    if (text.empty()) return false;
+    char* end = nullptr;
+    value = std::strtod(text.c_str(), &end);
+    return *end == '\0' && value > 0.0 && value < 1.0;
+}
+
+// The value of an option given as "--name value" or "--name=value"; false when missing.
+bool optionValue(int argc, char** argv, int& i, const std::string& name, std::string& value) {
+    const std::string argument = argv[i];
+    if (argument == name) {
+        if (i + 1 >= argc) return false;
+        value = argv[++i];
+        return true;
+    }
+    value = argument.substr(name.size() + 1);
+    return true;
+}
+
+bool usageError(const std::string& message, int& exitStatus) {
+    std::fprintf(stderr, "kelstat ti: %s\n", message.c_str());
+    std::fprintf(stderr, "Try 'kelstat ti --help'.\n");
+    exitStatus = kExitUsage;
+    return false;
+}
+
+bool parseTiOptions(int argc, char** argv, TiOptions& options, int& exitStatus) {
+    bool pathSeen = false;
+    bool optionsEnded = false;
+    for (int i = 1; i < argc; ++i) {
+        const std::string argument = argv[i];
+        if (optionsEnded || argument.size() < 2 || argument[0] != '-') {
+            if (pathSeen) return usageError("more than one FILE given", exitStatus);
+            options.path = argument;
+            pathSeen = true;
+            continue;
+        }
+        if (argument == "--") {
+            optionsEnded = true;
+        } else if (argument == "--help" || argument == "-h") {
+            printTiUsage(stdout);
+            exitStatus = kExitSuccess;
+            return false;
+        } else if (argument == "--json") {
+            options.json = true;
+        } else {
+            std::string name = argument.substr(0, argument.find('='));
+            std::string value;
+            if (name != "--model" && name != "--confidence" && name != "--proportion" &&
+                name != "--sided") {
+                return usageError("unknown option '" + argument + "'", exitStatus);
+            }
+            if (!optionValue(argc, argv, i, name, value)) {
+                return usageError("option " + name + " needs a value", exitStatus);
+            }
+            if (name == "--model") {
+                options.model = value;
+            } else if (name == "--confidence") {
+                if (!parseFraction(value, options.confidence)) {
+                    return usageError("confidence '" + value +
+                                          "' is not a fraction strictly between 0 and 1 "
+                                          "(write 0.95 for 95 %)",
+                                      exitStatus);
+                }
+            } else if (name == "--proportion") {
+                if (!parseFraction(value, options.proportion)) {
+                    return usageError("proportion '" + value +
+                                          "' is not a fraction strictly between 0 and 1 "
+                                          "(write 0.9 for 90 %)",
+                                      exitStatus);
+                }
+            } else if (value == "two") {
+                options.sided = kel_TwoSided;
+            } else if (value == "lower") {
+                options.sided = kel_LowerBound;
+            } else if (value == "upper") {
+                options.sided = kel_UpperBound;
+            } else {
+                return usageError("--sided takes two, lower or upper, not '" + value + "'",
+                                  exitStatus);
+            }
+        }
+    }
+    return true;
+}
+
+TiResult runModel(const ModelEntry& model, const std::vector<double>& values,
+                  const std::vector<double>& sorted, const TiOptions& options) {
+    TiResult result;
+    result.model = &model;
+    const auto count = static_cast<uint32_t>(values.size());
+    if (model.distribution == kNonParametric) {
+        kel_NonParametricTIData record{};
+        record.confidenceType = options.sided;
+        record.confidenceLevel = options.confidence;
+        record.proportion = options.proportion;
+        result.code = kel_CalcNonParametricToleranceInterval(sorted.data(), count, &record);
+        result.lowerLimit = record.lowerLimit;
+        result.upperLimit = record.upperLimit;
+        result.achievedConfidence = record.achievedConfidence;
+        return result;
+    }
+    kel_ParametricTIData record{};
+    record.distribution = static_cast<uint32_t>(model.distribution);
+    record.confidenceType = options.sided;
+    record.confidenceLevel = options.confidence;
+    record.proportion = options.proportion;
+    result.code = kel_CalcParametricToleranceInterval(values.data(), count, &record);
+    result.location = record.location;
+    result.scale = record.scale;
+    result.lowerKFactor = record.lowerKFactor;
+    result.upperKFactor = record.upperKFactor;
+    result.lowerLimit = record.lowerLimit;
+    result.upperLimit = record.upperLimit;
+    return result;
+}
+
+std::string formatNumber(double value, int digits) {
+    if (std::isnan(value)) return "-";
+    char buffer[48];
+    std::snprintf(buffer, sizeof buffer, "%.*g", digits, value);
+    return buffer;
+}
+
+// The shortest of 15, 16 or 17 significant digits that reads back as the same double.
+std::string jsonNumber(double value) {
+    if (!std::isfinite(value)) return "null";
+    char buffer[48];
+    for (int digits = 15; digits <= 17; ++digits) {
+        std::snprintf(buffer, sizeof buffer, "%.*g", digits, value);
+        if (std::strtod(buffer, nullptr) == value) break;
+    }
+    return buffer;
+}
+
+// The rows a result shows: a one-sided request shows only its own bound, and estimates or
+// K-factors only where the method has them.
+struct Row {
+    const char* label;
+    const char* key;
+    double TiResult::*field;
+};
+
+std::vector<Row> rowsFor(kel_ConfidenceType sided, bool anyParametric, bool anyNonParametric) {
+    std::vector<Row> rows;
+    if (anyParametric) {
+        rows.push_back({"location", "location", &TiResult::location});
+        rows.push_back({"scale", "scale", &TiResult::scale});
+        if (sided <= 0) rows.push_back({"lower K-factor", "lowerKFactor", &TiResult::lowerKFactor});
+        if (sided >= 0) rows.push_back({"upper K-factor", "upperKFactor", &TiResult::upperKFactor});
+    }
+    if (sided == kel_TwoSided) {
+        rows.push_back({"lower limit", "lowerLimit", &TiResult::lowerLimit});
+        rows.push_back({"upper limit", "upperLimit", &TiResult::upperLimit});
+    } else if (sided == kel_LowerBound) {
+        rows.push_back({"lower bound", "lowerLimit", &TiResult::lowerLimit});
+    } else {
+        rows.push_back({"upper bound", "upperLimit", &TiResult::upperLimit});
+    }
+    if (anyNonParametric) {
+        rows.push_back(
+            {"achieved confidence %", "achievedConfidence", &TiResult::achievedConfidence});
+    }
+    return rows;
+}
+
+void printText(const std::vector<TiResult>& results, const TiOptions& options, size_t count) {
+    bool anyParametric = false;
+    bool anyNonParametric = false;
+    for (const TiResult& result : results) {
+        (result.model->distribution == kNonParametric ? anyNonParametric : anyParametric) = true;
+    }
+    std::printf("%s tolerance %s: confidence %g, proportion %g, n = %zu\n",
+                sidedName(options.sided), options.sided == kel_TwoSided ? "interval" : "bound",
+                options.confidence, options.proportion, count);
+    const std::vector<Row> rows = rowsFor(options.sided, anyParametric, anyNonParametric);
+    if (results.size() == 1) {
+        const TiResult& result = results.front();
+        std::printf("%-22s %s\n", "model", result.model->title);
+        for (const Row& row : rows) {
+            std::printf("%-22s %s\n", row.label, formatNumber(result.*(row.field), 10).c_str());
+        }
+        std::printf("%-22s %d (%s)\n", "result code", static_cast<int>(result.code),
+                    codeMeaning(result.code));
+        return;
+    }
+    constexpr int kColumnWidth = 14;
+    std::printf("%-22s", "");
+    for (const TiResult& result : results) std::printf(" %*s", kColumnWidth, result.model->name);
+    std::printf("\n");
+    for (const Row& row : rows) {
+        std::printf("%-22s", row.label);
+        for (const TiResult& result : results) {
+            std::printf(" %*s", kColumnWidth, formatNumber(result.*(row.field), 7).c_str());
+        }
+        std::printf("\n");
+    }
+    std::printf("%-22s", "result code");
+    for (const TiResult& result : results) {
+        std::printf(" %*d", kColumnWidth, static_cast<int>(result.code));
+    }
+    std::printf("\n");
+    for (const TiResult& result : results) {
+        if (result.code != 0) {
+            std::printf("%s: code %d, %s\n", result.model->name, static_cast<int>(result.code),
+                        codeMeaning(result.code));
+        }
+    }
+}
+
+void printJson(const std::vector<TiResult>& results, const TiOptions& options, size_t count) {
+    std::printf(
+        "{\n  \"confidence\": %s,\n  \"proportion\": %s,\n  \"sided\": \"%s\",\n"
+        "  \"n\": %zu,\n  \"results\": [\n",
+        jsonNumber(options.confidence).c_str(), jsonNumber(options.proportion).c_str(),
+        options.sided == kel_TwoSided     ? "two"
+        : options.sided == kel_LowerBound ? "lower"
+                                          : "upper",
+        count);
+    for (size_t i = 0; i < results.size(); ++i) {
+        const TiResult& r = results[i];
+        std::printf(
+            "    {\"model\": \"%s\", \"code\": %d, \"codeMeaning\": \"%s\", "
+            "\"location\": %s, \"scale\": %s, \"lowerKFactor\": %s, "
+            "\"upperKFactor\": %s, \"lowerLimit\": %s, \"upperLimit\": %s, "
+            "\"achievedConfidence\": %s}%s\n",
+            r.model->name, static_cast<int>(r.code), codeMeaning(r.code),
+            jsonNumber(r.location).c_str(), jsonNumber(r.scale).c_str(),
+            jsonNumber(r.lowerKFactor).c_str(), jsonNumber(r.upperKFactor).c_str(),
+            jsonNumber(r.lowerLimit).c_str(), jsonNumber(r.upperLimit).c_str(),
+            jsonNumber(r.achievedConfidence).c_str(), i + 1 < results.size() ? "," : "");
+    }
+    std::printf("  ]\n}\n");
+}
+
+}  // namespace
+
+int runTiCommand(int argc, char** argv) {
+    TiOptions options;
+    int exitStatus = kExitUsage;
+    if (!parseTiOptions(argc, argv, options, exitStatus)) return exitStatus;
+
+    std::vector<const ModelEntry*> chosen;
+    for (const ModelEntry& model : kModels) {
+        if (options.model == "all" ? model.available : options.model == model.name) {
+            chosen.push_back(&model);
+        }
+    }
+    if (chosen.empty()) {
+        usageError("unknown model '" + options.model + "'; choose one of " + availableModelNames() +
+                       ", or all",
+                   exitStatus);
+        return exitStatus;
+    }
+    if (!chosen.front()->available) {
+        usageError("the " + std::string(chosen.front()->title) +
+                       " model is not available in this version; choose one of " +
+                       availableModelNames() + ", or all",
+                   exitStatus);
+        return exitStatus;
+    }
+
+    std::vector<double> values;
+    std::string error;
+    if (!readNumbersFromPath(options.path, values, error)) {
+        std::fprintf(stderr, "kelstat ti: %s\n", error.c_str());
+        return kExitUsage;
+    }
+    if (values.empty()) {
+        std::fprintf(stderr, "kelstat ti: no numbers to work on\n");
+        return kExitUsage;
+    }
+    if (values.size() > std::numeric_limits<uint32_t>::max()) {
+        std::fprintf(stderr, "kelstat ti: too many numbers (%zu)\n", values.size());
+        return kExitUsage;
+    }
+    // The order-statistic method reads its input as sorted; the models take any order.
+    std::vector<double> sorted;
+    for (const ModelEntry* model : chosen) {
+        if (model->distribution == kNonParametric) {
+            sorted = values;
+            std::sort(sorted.begin(), sorted.end());
+        }
+    }
+
+    std::vector<TiResult> results;
+    for (const ModelEntry* model : chosen) {
+        results.push_back(runModel(*model, values, sorted, options));
+    }
+    if (options.json) {
+        printJson(results, options, values.size());
+    } else {
+        printText(results, options, values.size());
+    }
+    if (results.size() == 1 && results.front().code != 0) {
+        std::fprintf(stderr, "kelstat ti: %s\n", codeMeaning(results.front().code));
+        return kExitRefused;
+    }
+    return kExitSuccess;
+}
+
+}  // namespace kelstat::cli
