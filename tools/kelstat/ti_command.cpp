@@ -291,6 +291,20 @@ std::vector<Row> rowsFor(kel_ConfidenceType sided, bool anyParametric, bool anyN
     return rows;
 }
 
+// Order statistics come in whole steps: a sample too small for the request cannot reach the
+// confidence asked for, and the user should not miss that.
+void noteShortfall(const std::vector<TiResult>& results, const TiOptions& options, size_t count) {
+    for (const TiResult& result : results) {
+        if (result.model->distribution == kNonParametric &&
+            result.achievedConfidence < 100.0 * options.confidence) {
+            std::printf(
+                "note: %zu observations are too few for the nonparametric method to reach "
+                "%g %% confidence; the limits above reach %.4g %%\n",
+                count, 100.0 * options.confidence, result.achievedConfidence);
+        }
+    }
+}
+
 void printText(const std::vector<TiResult>& results, const TiOptions& options, size_t count) {
     bool anyParametric = false;
     bool anyNonParametric = false;
@@ -309,6 +323,7 @@ void printText(const std::vector<TiResult>& results, const TiOptions& options, s
         }
         std::printf("%-22s %d (%s)\n", "result code", static_cast<int>(result.code),
                     codeMeaning(result.code));
+        noteShortfall(results, options, count);
         return;
     }
     constexpr int kColumnWidth = 14;
@@ -333,6 +348,7 @@ void printText(const std::vector<TiResult>& results, const TiOptions& options, s
                         codeMeaning(result.code));
         }
     }
+    noteShortfall(results, options, count);
 }
 
 void printJson(const std::vector<TiResult>& results, const TiOptions& options, size_t count) {
