@@ -13,7 +13,7 @@
 #include <limits>
 
 #include "specfun/bratio_table.h"
-#include "specfun/polygamma.h"
+#include "specfun/polygamma.h"  // psi: -ans[0] of XDPSIFN(x, 0, 1, 1)
 
 namespace kelstat {
 
@@ -202,16 +202,6 @@ double bcorr(double a0, double b0) {
     const double w = stirlingDifference(b, x, c / b);
     const double t = (1.0 / a) * (1.0 / a);
     return polynomial(kStirling, t) / a + w;
-}
-
-// psi(x): the digamma function, through Amos's scaled polygamma routine (n = 0, kode = 1, m = 1
-// gives -psi(x)). Its flags are not examined: apser calls it only for 0 < x <= 0.02 / eps.
-double psi(double x) {
-    double negativePsi = 0.0;
-    int underflowCount = 0;
-    int errorFlag = 0;
-    XDPSIFN(x, 0, 1, 1, &negativePsi, &underflowCount, &errorFlag);
-    return -negativePsi;
 }
 
 // ---------------------------------------------------------------------------------------------
@@ -684,6 +674,7 @@ double fpser(double a, double b, double x, double eps) {
 double apser(double a, double b, double x, double eps) {
     const double bx = b * x;
     double t = x - bx;
+    // Once b eps > 0.02, psi(b) is ln b to working precision.
     const double c =
         b * eps > 2e-2 ? std::log(bx) + kEulerGamma + t : std::log(x) + psi(b) + kEulerGamma + t;
     const double tolerance = 5.0 * eps * std::fabs(c);
