@@ -114,6 +114,20 @@ TEST(MatrixEigenSystem, DiagonalMatrixIsSortedWithUnitColumns) {
     }
 }
 
+TEST(MatrixEigenSystem, ValuesEqualWithinTheFuzzKeepTheirOrder) {
+    const double nearlyOne = 1.0 + 5e-13;
+    matrix<double> a(3, 3, 0.0);
+    a(0, 0) = nearlyOne;
+    a(1, 1) = 1.0;
+    a(2, 2) = 3.0;
+    Vector values;
+    matrix<double> vectors;
+    ASSERT_EQ(mEigenSystemsIterator(a, values, vectors), 0);
+    EXPECT_EQ(values, (Vector{nearlyOne, 1.0, 3.0}));
+    EXPECT_EQ(vectors(0, 0), 1.0);
+    EXPECT_EQ(vectors(1, 1), 1.0);
+}
+
 TEST(MatrixEigenSystem, UpperTriangleIsNotRead) {
     std::mt19937_64 engine(7);
     const matrix<double> a = symmetricFrom(kelstat_test::randomMatrix(6, 6, engine));
