@@ -350,6 +350,32 @@ TEST(StemLeafBadInput, ValueTooFarFromZero) {
     kel_DeleteStemAndLeafContainer(&container);
 }
 
+TEST(StemLeafBadInput, InfiniteColumnsEndWithACode) {
+    // Whatever scale infinite data produce, the run ends with a code and attaches nothing.
+    const std::vector<std::vector<double>> columns = {
+        {0, kInf},   {-kInf, 0}, {-kInf, kInf}, {kInf, kInf, kInf}, {-kInf, -kInf, 1, 2, 3},
+        {1, 2, kInf}};
+    for (const auto& column : columns) {
+        for (const double increment : {0.0, 1.0, kInf}) {
+            for (const std::uint8_t trim : {0, 1}) {
+                kel_StemAndLeafScaleInfo scale{};
+                scale.increment = increment;
+                scale.trimOutliers = trim;
+                const auto n = static_cast<std::uint32_t>(column.size());
+                ASSERT_EQ(kel_FindStemAndLeafScaleInfo(column.data(), n, &scale), KEL_OK);
+                kel_StemAndLeaf* container = kel_CreateStemAndLeafContainer();
+                const std::int32_t code = kel_RunStemAndLeaf(column.data(), n, &scale, container);
+                EXPECT_TRUE(code == KEL_STEMLEAF_INVALID_INPUT ||
+                            code == KEL_STEMLEAF_VALUE_TOO_LARGE)
+                    << code;
+                EXPECT_EQ(container->lines, nullptr);
+                EXPECT_EQ(container->isComplete, 0);
+                kel_DeleteStemAndLeafContainer(&container);
+            }
+        }
+    }
+}
+
 TEST(StemLeafBadInput, TooManyLinesAttachNothing) {
     // 2e7 leaf units apart at one leaf unit per line: 20 000 001 lines.
     const double data[] = {0, 2e7};
