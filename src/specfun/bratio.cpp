@@ -715,6 +715,14 @@ struct Oriented {
     double y;
 };
 
+// Published switching points of the driver. The x cutoffs (0.1, 0.3, 0.7, 0.9) and the shape
+// cutoffs 0.2 and 1 stay inline where they are tested; these four bound the expansions' domains.
+constexpr double kBgratMinShape = 15.0;  // bgrat needs its large shape at least this big
+constexpr double kContinuedFractionMinShape = 40.0;  // below it b is lowered by bup instead
+constexpr double kBasymMinShape = 100.0;
+constexpr double kBasymMaxLambdaShare = 0.03;  // lambda at most this share of the smaller shape
+constexpr int kRecurrenceSteps = 20;           // steps of bup that lift a small shape for bgrat
+
 // bup over n steps of b, then bgrat for the rest: the upper tail when a <= 1 and b is moderate.
 Tails upperByRecurrence(Oriented s, int steps, double eps) {
     double w1 = bup(s.b, s.a, s.y, s.x, steps, eps);
@@ -724,7 +732,6 @@ Tails upperByRecurrence(Oriented s, int steps, double eps) {
 
 // min(a, b) <= 1, with x <= 0.5 after orientation.
 Tails smallShapeTails(Oriented s, double eps) {
-    constexpr int kRecurrenceSteps = 20;
     if (s.b < std::min(eps, eps * s.a)) return fromLower(fpser(s.a, s.b, s.x, eps));
     if (s.a < std::min(eps, eps * s.b) && s.b * s.x <= 1.0) {
         return fromUpper(apser(s.a, s.b, s.x, eps));
@@ -739,7 +746,7 @@ Tails smallShapeTails(Oriented s, double eps) {
     if (s.b <= 1.0) return fromLower(bpser(s.a, s.b, s.x, eps));
     if (s.x >= 0.3) return fromUpper(bpser(s.b, s.a, s.y, eps));
     if (s.x < 0.1 && std::pow(s.x * s.b, s.a) <= 0.7) return fromLower(bpser(s.a, s.b, s.x, eps));
-    if (s.b > 15.0) {
+    if (s.b > kBgratMinShape) {
         double w1 = 0.0;
         (void)bgrat(s.b, s.a, s.y, s.x, &w1, 15.0 * eps);
         return fromUpper(w1);
@@ -747,7 +754,8 @@ Tails smallShapeTails(Oriented s, double eps) {
     return upperByRecurrence(s, kRecurrenceSteps, eps);
 }
 
-// 1 < a, b < 40 side of b, with b x > 0.7: reduce b to (0, 1] by bup, then bpser or bgrat.
+// min(a, b) > 1, b below the continued fraction's range and b x > 0.7: bup lowers b to (0, 1],
+// then bpser (x <= 0.7) or bgrat adds the rest.
 Tails moderateShapeTails(Oriented s, double eps) {
     int steps = static_cast<int>(s.b);
     double reducedB = s.b - steps;
@@ -759,10 +767,9 @@ Tails moderateShapeTails(Oriented s, double eps) {
     if (s.x <= 0.7) return fromLower(w + bpser(s.a, reducedB, s.x, eps));
 
     double a = s.a;
-    if (a <= 15.0) {
-        constexpr int kRaiseSteps = 20;
-        w += bup(a, reducedB, s.x, s.y, kRaiseSteps, eps);
-        a += kRaiseSteps;
+    if (a <= kBgratMinShape) {
+        w += bup(a, reducedB, s.x, s.y, kRecurrenceSteps, eps);
+        a += kRecurrenceSteps;
     }
     (void)bgrat(a, reducedB, s.x, s.y, &w, 15.0 * eps);
     return fromLower(w);
@@ -770,13 +777,13 @@ Tails moderateShapeTails(Oriented s, double eps) {
 
 // min(a, b) > 1, oriented so that lambda = a - (a + b) x >= 0.
 Tails largeShapeTails(Oriented s, double lambda, double eps) {
-    if (s.b < 40.0) {
+    if (s.b < kContinuedFractionMinShape) {
         if (s.b * s.x <= 0.7) return fromLower(bpser(s.a, s.b, s.x, eps));
         return moderateShapeTails(s, eps);
     }
     // basym only near the mean of two large shapes; the continued fraction elsewhere.
     const double smaller = s.a > s.b ? s.b : s.a;
-    if (smaller <= 100.0 || lambda > 0.03 * smaller) {
+    if (smaller <= kBasymMinShape || lambda > kBasymMaxLambdaShare * smaller) {
         return fromLower(bfrac(s.a, s.b, s.x, s.y, lambda, 15.0 * eps));
     }
     return fromLower(basym(s.a, s.b, lambda, 100.0 * eps));
