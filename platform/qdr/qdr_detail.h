@@ -11,7 +11,7 @@ namespace qdr_detail {
 
 // Every Boost error becomes a quiet NaN (or the saturated value for overflow), never an exception.
 // Internal arithmetic stays promoted to long double: in double, Boost's incomplete gamma function
-// loses hundreds of ulps at large shapes.
+// loses up to thousands of ulps in the far tails at large shapes.
 using AccuratePolicy = boost::math::policies::policy<
     boost::math::policies::domain_error<boost::math::policies::ignore_error>,
     boost::math::policies::pole_error<boost::math::policies::ignore_error>,
@@ -21,6 +21,19 @@ using AccuratePolicy = boost::math::policies::policy<
     boost::math::policies::evaluation_error<boost::math::policies::ignore_error>,
     boost::math::policies::rounding_error<boost::math::policies::ignore_error>,
     boost::math::policies::indeterminate_result_error<boost::math::policies::ignore_error>>;
+
+// The same evaluated in double: several times faster for the incomplete gamma function, used only
+// where its error stays close to the function's conditioning.
+using FastPolicy = boost::math::policies::policy<
+    boost::math::policies::domain_error<boost::math::policies::ignore_error>,
+    boost::math::policies::pole_error<boost::math::policies::ignore_error>,
+    boost::math::policies::overflow_error<boost::math::policies::ignore_error>,
+    boost::math::policies::underflow_error<boost::math::policies::ignore_error>,
+    boost::math::policies::denorm_error<boost::math::policies::ignore_error>,
+    boost::math::policies::evaluation_error<boost::math::policies::ignore_error>,
+    boost::math::policies::rounding_error<boost::math::policies::ignore_error>,
+    boost::math::policies::indeterminate_result_error<boost::math::policies::ignore_error>,
+    boost::math::policies::promote_double<false>>;
 
 // Sum of values[0..count) by pairwise blocks: error grows with log(count), not count.
 double pairwiseSum(const double* values, std::size_t count);

@@ -26,8 +26,10 @@ constexpr int kExtremeValueMaxIterations = 200;
 constexpr int kLogisticMaxIterations = 200;
 constexpr int kLogisticMaxHalvings = 60;
 
-// Logistic steps smaller than this (relative to the scale) are in the quadratic regime: taken
-// without a likelihood check (whose rounding would reject them) and ending the iteration.
+// Logistic steps below kLogisticTrustedStep (relative to the scale) are in Newton's quadratic
+// regime and are taken without the likelihood check, whose rounding would reject them; one below
+// kLogisticFinalStep leaves an error of its square and ends the iteration.
+constexpr double kLogisticTrustedStep = 1e-3;
 constexpr double kLogisticFinalStep = 1e-9;
 
 // Accumulation block for long sums: keeps the error of plain summation small without recursion.
@@ -411,6 +413,14 @@ int fitLogistic(const double* data, unsigned int count, double* fit, double* cov
             cov[1] = state.hessianMuSigma / finalDeterminant * spreadSquared;
             cov[2] = -state.hessianMuMu / finalDeterminant * spreadSquared;
             return QDR_FIT_OK;
+        }
+        const bool newton = a < 0.0 && determinant > 0.0;
+        if (newton && std::fabs(stepMu) <= kLogisticTrustedStep * sigma &&
+            std::fabs(stepSigma) <= kLogisticTrustedStep * sigma) {
+            mu += stepMu;
+            sigma += stepSigma;
+            state = logisticState(standardised, count, mu, sigma);
+            continue;
         }
         // Step halving until the likelihood does not decrease and the scale stays positive.
         bool accepted = false;
