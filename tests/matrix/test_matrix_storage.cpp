@@ -72,14 +72,21 @@ TEST(MatrixStorage, PackedSymmetricSharesMirroredElements) {
     Smatrix<double> s(3, 0.0);
     EXPECT_EQ(s.size(), 6);
     EXPECT_EQ(Smatrix<double>::calculate_size(3), 6);
-    s(0, 2) = 1.5;
-    EXPECT_EQ(s(2, 0), 1.5);
-    // Packed order (0,0), (1,0), (1,1), (2,0), (2,1), (2,2): (2, 0) is element 3, (2, 2) element 5.
-    s(2, 2) = 2.5;
-    const UTmatrix<double> upper = s.mSmatrixToUTmatrix();
-    const UTmatrix<double> expected(3, Vector{0, 0, 1.5, 0, 0, 2.5});
-    EXPECT_EQ(matrix<double>(upper)(0, 2), matrix<double>(expected)(0, 2));
-    EXPECT_EQ(matrix<double>(upper)(2, 2), 2.5);
+    int next = 1;
+    for (int i = 0; i < 3; ++i) {
+        for (int j = 0; j <= i; ++j) s(j, i) = next++;  // written through the upper triangle
+    }
+    EXPECT_EQ(s.getRowVector(2), (Vector{4, 5, 6}));
+    EXPECT_EQ(s.getColVector(0), (Vector{1, 2, 4}));
+    // Its upper triangle packed by rows: (0,0), (0,1), (0,2), (1,1), (1,2), (2,2).
+    Vector flat;
+    matrix<double>(s.mSmatrixToUTmatrix()).mFlattenMatrix(flat, 0, true);
+    EXPECT_EQ(flat, (Vector{1, 2, 4, 0, 3, 5, 0, 0, 6}));
+    const Smatrix<double> mirrored =
+        vek::matrix_library::mUTmatrixToSmatrix(UTmatrix<double>(3, Vector{1, 2, 4, 3, 5, 6}));
+    EXPECT_EQ(mirrored.getRowVector(1), s.getRowVector(1));
+    s.mFlattenMatrix(flat, 2, true);
+    EXPECT_EQ(flat, (Vector{4, 5, 6}));
 }
 
 TEST(MatrixStorage, UpperTriangleIgnoresWritesBelowTheDiagonal) {
@@ -228,6 +235,37 @@ TEST(MatrixStorage, MisuseMessages) {
     EXPECT_EQ(messageOf<std::overflow_error>([&] { a /= -0.0; }), "op/ scalar division by zero");
     EXPECT_EQ(messageOf<MatrixSingular>([] { inverseWithThrow(Dmatrix<double>(2, 0.0)); }),
               "Matrix is singular");
+}
+
+// Arguments the design leaves unchecked are refused rather than read out of bounds.
+TEST(MatrixStorage, UncheckedArgumentsAreRefused) {
+    matrix<double> a(2, 2, 1.0);
+    Smatrix<double> s(2, 1.0);
+    UTmatrix<double> u(2, 1.0);
+    Dmatrix<double> d(2, 1.0);
+    Vector v{1.0, 2.0};
+    Vector none;
+    struct Case {
+        std::function<void()> action;
+        const char* expected;
+    };
+    const Case cases[] = {
+        {[&] { a.insertRow(3, 0.0); }, "insertRow: row index out of range"},
+        {[&] { a.insertCol(-1, 0.0); }, "insertCol: column index out of range"},
+        {[&] { a.mFlattenMatrix(v, -1, true); }, "mFlattenMatrix: negative start index"},
+        {[&] { s.getSubmatrix(1, 0, 2, 1); }, "Smatrix::getSubmatrix incompatible matrices"},
+        {[&] { s.UpdateForFisher(v, v, v, 3); },
+         "UpdateForFisher: count exceeds the order or a vector's length"},
+        {[&] { s.UpdateForFisher(v, Vector{1.0}, v, 2); },
+         "UpdateForFisher: count exceeds the order or a vector's length"},
+        {[&] { d.removeColRow(2); }, "Dmatrix::removeColRow index out of range"},
+        {[&] { u.CholeskyDecomp(-1, nullptr, nullptr); }, "UTmatrix: starting row is negative"},
+        {[&] { vek::matrix_library::KTimesColumn(s, 1.0, 2, 1); },
+         "matrix: column index out of range"},
+        {[&] { vek::matrix_library::KTimesColumnPlusVector(u, 1.0, 0, none, 2); },
+         "matrix: vector shorter than the number of products"},
+    };
+    for (const Case& c : cases) EXPECT_EQ(messageOf<MatrixException>(c.action), c.expected);
 }
 
 TEST(MatrixStorage, SymmetricCastToleratesRoundingOnly) {
