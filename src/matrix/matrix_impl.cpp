@@ -18,14 +18,13 @@ using allege::allegeThat;
 
 namespace {
 
-// Mirrored elements count as equal below this, absolutely and relative to the larger one.
+// Mirrored elements may differ by rounding: this much relative to the larger, plus this much.
 constexpr double kSymmetryTolerance = 4e-12;
 
 bool mirrorsAgree(double first, double second) {
     const double difference = std::fabs(first - second);
     const double larger = std::max(std::fabs(first), std::fabs(second));
-    return difference < kSymmetryTolerance ||
-           difference < kSymmetryTolerance * larger + kSymmetryTolerance;
+    return difference < kSymmetryTolerance * larger + kSymmetryTolerance;
 }
 
 // A block of extent `count` starting at `start` lies inside [0, limit).
@@ -94,11 +93,10 @@ template <class T>
 matrix<T>& matrix<T>::operator=(const std::vector<T>& column) {
     if (v_ == column) return *this;
     const int rows = detail::checkedCount(static_cast<std::int64_t>(column.size()));
-    std::vector<T> elements(column);
+    v_ = column;
     m_ = rows;
     n_ = 1;
     mn_ = rows;
-    v_.swap(elements);
     return *this;
 }
 
@@ -217,6 +215,7 @@ template <class T>
 void matrix<T>::setRow(int i, const matrix& source) {
     allegeThat(0 <= i && i < m_, sites::kSetRowMatrix);
     if (source.mn_ != n_) throw MatrixException("matrix::setRow incompatible matrices");
+    if (&source == this) return;  // a row vector set from itself
     std::copy(source.v_.begin(), source.v_.end(), v_.begin() + static_cast<std::ptrdiff_t>(i) * n_);
 }
 
