@@ -2,10 +2,10 @@
 #ifndef KELSTAT_TESTS_MATRIX_MATRIX_TEST_SUPPORT_H
 #define KELSTAT_TESTS_MATRIX_MATRIX_TEST_SUPPORT_H
 
+#include <exception>
 #include <functional>
 #include <random>
 #include <string>
-#include <typeinfo>
 
 #include "matrix/matrix_new.h"
 
@@ -24,7 +24,7 @@ std::string messageOf(const std::function<void()>& action) {
     return "<no exception>";
 }
 
-// A dense n x n matrix of uniform deviates on [-1, 1).
+// A dense rows x cols matrix of uniform deviates on [-1, 1).
 inline vek::matrix_library::matrix<double> randomMatrix(int rows, int cols,
                                                         std::mt19937_64& engine) {
     std::uniform_real_distribution<double> uniform(-1.0, 1.0);
