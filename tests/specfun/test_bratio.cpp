@@ -190,19 +190,21 @@ TEST(Bratio, InvalidArgumentsAreFlaggedInOrder) {
 
 TEST(Bratio, DegenerateArgumentsGiveExactValues) {
     const struct {
+        const char* name;
         double a, b, x, y, w, w1;
     } cases[] = {
-        {2.0, 3.0, 0.0, 1.0, 0.0, 1.0},                                        // x = 0
-        {2.0, 0.0, 0.4, 0.6, 0.0, 1.0},                                        // b = 0
-        {0.0, 1e-300, 0.5, 0.5, 1.0, 0.0},    {2.0, 3.0, 1.0, 0.0, 1.0, 0.0},  // y = 0
-        {0.0, 2.0, 0.5, 0.5, 1.0, 0.0},                                        // a = 0
-        {1e-19, 3e-19, 0.2, 0.8, 0.75, 0.25},  // both below 1e-18: b/(a+b), a/(a+b)
+        {"x = 0", 2.0, 3.0, 0.0, 1.0, 0.0, 1.0},
+        {"b = 0", 2.0, 0.0, 0.4, 0.6, 0.0, 1.0},
+        {"y = 0", 2.0, 3.0, 1.0, 0.0, 1.0, 0.0},
+        {"a = 0", 0.0, 2.0, 0.5, 0.5, 1.0, 0.0},
+        {"a = 0, b tiny", 0.0, 1e-300, 0.5, 0.5, 1.0, 0.0},
+        {"both below 1e-18", 1e-19, 3e-19, 0.2, 0.8, 0.75, 0.25},  // b/(a+b), a/(a+b)
     };
     for (const auto& c : cases) {
         const Ratio r = bratio(c.a, c.b, c.x, c.y);
-        EXPECT_EQ(r.ierr, 0);
-        EXPECT_EQ(r.w, c.w) << c.a << " " << c.b << " " << c.x;
-        EXPECT_EQ(r.w1, c.w1) << c.a << " " << c.b << " " << c.x;
+        EXPECT_EQ(r.ierr, 0) << c.name;
+        EXPECT_EQ(r.w, c.w) << c.name;
+        EXPECT_EQ(r.w1, c.w1) << c.name;
     }
 }
 
@@ -238,7 +240,7 @@ TEST(Bratio, WorkedValues) {
     EXPECT_NEAR(r.w, 0.5248, 1e-15);
     EXPECT_NEAR(r.w1, 0.4752, 1e-15);
 
-    // Tiny a: I_0.3(1e-20, 0.5) = 1 - a * (-ln 0.3 - psi(0.5) - gamma - ...) to first order.
+    // Tiny a: the complement is of order a, from the series that needs psi(0.5).
     r = bratio(1e-20, 0.5, 0.3, 0.7);
     EXPECT_EQ(r.w, 1.0);
     const double expectedW1 =
