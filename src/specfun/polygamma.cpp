@@ -143,26 +143,87 @@ double expansionSumLower(double order, double reciprocalSquare, double tolerance
     return sum;
 }
 
-// Completes -psi(x) from the value at the shifted argument: adds 1/(x + k) for the recurrence
-// steps (smallest terms first) and removes the logarithm (kode 1) or its shift (kode 2). The
-// rounding errors of the additions are carried separately and added back after the logarithm is
-// taken off, since near the root of psi the sum and the logarithm nearly cancel.
-void finishDigamma(double sum, double x, int steps, double shifted, double logShifted, int kode,
+// A sum whose rounding errors are carried separately (Knuth's two-sum), for the digamma function
+// near its root, where the result is far smaller than the terms.
+class CompensatedSum {
+  public:
+    explicit CompensatedSum(double start) : value_(start) {}
+    void add(double term) {
+        const double total = value_ + term;
+        const double termPart = total - value_;
+        error_ += (value_ - (total - termPart)) + (term - termPart);
+        value_ = total;
+    }
+    // Adds a correction known to be far below the rounding unit of the sum.
+    void addCorrection(double correction) { error_ += correction; }
+    // An infinite sum leaves a NaN error term behind; the sum itself is the answer then.
+    double result() const { return std::isfinite(value_) ? value_ + error_ : value_; }
+
+  private:
+    double value_;
+    double error_ = 0.0;
+};
+
+// The rounding error of sum = fl(a + b): a + b = sum + error exactly.
+double additionError(double a, double b, double sum) {
+    const double bPart = sum - a;
+    return (a - (sum - bPart)) + (b - bPart);
+}
+
+// ln 2 split so that (binary exponent) * kLn2High is exact.
+constexpr double kLn2High = 6.93147180369123816490e-01;
+constexpr double kLn2Low = 1.90821492927058770002e-10;
+
+// ln(y) for y >= 1 as high + low with about 1e-17 absolute error: y = 2^e m, 1 <= m < 2, gives
+// ln y = e ln 2 + log1p(m - 1), where m - 1 and e * kLn2High are exact.
+void splitLog(double y, double* high, double* low) {
+    if (!std::isfinite(y)) {
+        *high = std::log(y);
+        *low = 0.0;
+        return;
+    }
+    int exponent = 0;
+    const double mantissa = 2.0 * std::frexp(y, &exponent);
+    const double binaryExponent = static_cast<double>(exponent - 1);
+    const double exponentPart = binaryExponent * kLn2High;
+    const double mantissaPart = std::log1p(mantissa - 1.0);
+    *high = exponentPart + mantissaPart;
+    *low = additionError(exponentPart, mantissaPart, *high) + binaryExponent * kLn2Low;
+}
+
+// Completes -psi(x) from the expansion's value `sum` at shifted = x + shift (rounded): adds
+// 1/(x + k) for the recurrence steps, smallest first, and takes off the logarithm (kode 1) or its
+// shift (kode 2). Near the root of psi the result is some 20 times smaller than the sum and the
+// logarithm, so for kode 1 the additions, the reciprocals, the logarithm and the rounding of
+// x + shift are all carried to about 1e-17; the method is unchanged.
+void finishDigamma(double sum, double x, int steps, double shift, double shifted, int kode,
                    double* ans) {
-    double lostLowBits = 0.0;
+    CompensatedSum total(sum);
     for (int k = steps - 1; k >= 0; --k) {
-        // x + k in one rounding keeps 1/x accurate for tiny x.
-        const double term = 1.0 / (x + static_cast<double>(k));
-        const double total = sum + term;
-        lostLowBits +=
-            std::fabs(sum) >= std::fabs(term) ? (sum - total) + term : (term - total) + sum;
-        sum = total;
+        // x + k first, in one rounding, keeps 1/x accurate for tiny x.
+        const double offset = static_cast<double>(k);
+        const double denominator = x + offset;
+        const double denominatorLow = additionError(x, offset, denominator);
+        const double reciprocal = 1.0 / denominator;
+        total.add(reciprocal);
+        total.addCorrection(
+            (std::fma(-reciprocal, denominator, 1.0) - reciprocal * denominatorLow) / denominator);
     }
-    if (kode == 1) {
-        ans[0] = (sum - logShifted) + lostLowBits;
-    } else {
-        ans[0] = (shifted == x ? sum : sum - std::log(shifted / x)) + lostLowBits;
+    if (kode == 2) {
+        if (shifted != x) total.add(-std::log(shifted / x));
+        ans[0] = total.result();
+        return;
     }
+    double logHigh = 0.0;
+    double logLow = 0.0;
+    splitLog(shifted, &logHigh, &logLow);
+    total.add(-logHigh);
+    // The expansion ran at the rounded x + shift; -psi'(shifted) * (rounding error), with
+    // psi'(y) ~ 1/y + 1/(2 y^2), moves it to the exact point.
+    const double shiftedLow = additionError(x, shift, shifted);
+    const double trigamma = (1.0 + 0.5 / shifted) / shifted;
+    total.addCorrection(-logLow - trigamma * shiftedLow);
+    ans[0] = total.result();
 }
 
 // Orders n .. n+count-1 by the asymptotic expansion at x shifted up to the expansion's start,
@@ -203,7 +264,7 @@ Status expandAndRecur(double x, double logX, int n, int kode, int count, double 
     }
     const int steps = static_cast<int>(shift);
     if (order == 0.0) {
-        finishDigamma(sum, x, steps, shifted, logShifted, kode, ans);
+        finishDigamma(sum, x, steps, shift, shifted, kode, ans);
         return Status::finished;
     }
 
@@ -223,7 +284,7 @@ Status expandAndRecur(double x, double logX, int n, int kode, int count, double 
                leadingTerms(order, halfReciprocal)) *
               scale;
         if (order == 0.0) {
-            finishDigamma(sum, x, steps, shifted, logShifted, kode, ans);
+            finishDigamma(sum, x, steps, shift, shifted, kode, ans);
             return Status::finished;
         }
         for (int k = 0; k < steps; ++k) {

@@ -5,6 +5,7 @@
 
 #include <cstdlib>
 #include <fstream>
+#include <iomanip>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -30,6 +31,13 @@ inline std::vector<std::vector<double>> readReferenceTable(const std::string& na
         rows.push_back(row);
     }
     return rows;
+}
+
+// An error figure for test reports, e.g. "3.2e-15".
+inline std::string scientific(double value) {
+    std::ostringstream out;
+    out << std::setprecision(2) << std::scientific << value;
+    return out.str();
 }
 
 }  // namespace kelstat_test

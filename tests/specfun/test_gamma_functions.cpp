@@ -77,8 +77,8 @@ TEST(GammaFunctions, LogGammaSweep) {
     }
     EXPECT_LE(worstRelative, 1e-14);
     EXPECT_LE(worstAbsolute, 4e-15);
-    RecordProperty("worst_relative_x_ge_3", std::to_string(worstRelative));
-    RecordProperty("worst_absolute_x_below_3", std::to_string(worstAbsolute));
+    RecordProperty("worst_relative_x_ge_3", kelstat_test::scientific(worstRelative));
+    RecordProperty("worst_absolute_x_below_3", kelstat_test::scientific(worstAbsolute));
 }
 
 TEST(GammaFunctions, GammaKnownValuesAndSweep) {
@@ -129,7 +129,7 @@ TEST(IncompleteGamma, MatchesReferenceTable) {
         EXPECT_LE(error, 1e-13) << "a = " << a << ", x = " << x;
         worst = std::max(worst, error);
     }
-    RecordProperty("worst_absolute_error", std::to_string(worst));
+    RecordProperty("worst_absolute_error", kelstat_test::scientific(worst));
 }
 
 struct Regime {
@@ -220,7 +220,7 @@ TEST(IncompleteGamma, EveryMethodAgainstBoost) {
         }
         EXPECT_LE(worst, 1e-13) << regime.name << ": worst at a = " << worstPoint[0]
                                 << ", x = " << worstPoint[1];
-        RecordProperty(regime.name, std::to_string(worst));
+        RecordProperty(regime.name, kelstat_test::scientific(worst));
     }
 }
 
