@@ -11,9 +11,9 @@ namespace kelstat {
 
 namespace {
 
-// The library's 16-point rule: the Gauss-Legendre positive nodes, ascending, rounded to 12
-// decimals, and weights rounded to 15. These decimals are the rule itself; its weights sum to 1
-// within about 1e-15, not exactly.
+// The library's 16-point rule: the Gauss-Legendre positive nodes, ascending, to 12 decimals, and
+// their weights to 15 (two not correctly rounded in the last decimal). These decimals are the
+// rule itself; its weights sum to 1 within about 1e-15, not exactly.
 constexpr std::size_t kTablePairs = 8;
 constexpr double kTableNodes[kTablePairs] = {
     0.095012509838, 0.281603550779, 0.458016777657, 0.617876244403,
