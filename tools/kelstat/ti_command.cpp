@@ -434,6 +434,8 @@ int runTiCommand(int argc, char** argv) {
         printJson(results, options, values.size());
     } else {
         printText(results, options, values.size());
+        if (values.size() < 2)
+            std::printf("note: tolerance limits need at least two observations\n");
     }
     if (results.size() == 1 && results.front().code != 0) {
         std::fprintf(stderr, "kelstat ti: %s\n", codeMeaning(results.front().code));
