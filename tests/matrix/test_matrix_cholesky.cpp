@@ -17,7 +17,6 @@ using kelstat_test::randomPositiveDefinite;
 using vek::matrix_library::CholeskyBackSub;
 using vek::matrix_library::CholeskyDecomp;
 using vek::matrix_library::CholeskyDecompWithThrow;
-using vek::matrix_library::CholeskyInverse;
 using vek::matrix_library::MatrixException;
 using vek::matrix_library::MatrixSingular;
 using vek::matrix_library::Smatrix;
