@@ -189,10 +189,14 @@ int fitGamma(const double* data, unsigned int count, double* fit) {
     const double reference = robustMean(data, count);
     BlockSum deviationSum;
     BlockSum excessSum;
+    const double logReference = std::log(reference);
     for (unsigned int i = 0; i < count; ++i) {
         const double d = (data[i] - reference) / reference;
         deviationSum.add(d);
-        excessSum.add(logExcess(d));
+        // Far from the mean, 1 + d may have lost x / reference entirely (x tiny against a huge
+        // mean), so the logarithm is taken of x itself.
+        excessSum.add(std::fabs(d) > kLogExcessSeriesLimit ? d - (std::log(data[i]) - logReference)
+                                                           : logExcess(d));
     }
     // ln(mean/reference) = log1p(mean d) brings the reference to the exact mean.
     const double meanDeviation = deviationSum.value() / n;

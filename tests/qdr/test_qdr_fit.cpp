@@ -167,6 +167,17 @@ TEST(QdrFitGamma, ScalesWithTheDataAndHandlesNearlyConstantSamples) {
     EXPECT_NEAR(static_cast<double>(fit[1] * 2 * s), 1.0, 1e-6);  // shape ~ 1 / (2 s)
 }
 
+TEST(QdrFitGamma, SurvivesObservationsSpanningTheWholeRange) {
+    // 1e-300 / mean underflows against the mean 5e299: the log of the ratio must come from logs.
+    const double data[] = {1e-300, 1e300};
+    double fit[2];
+    ASSERT_EQ(qdr_FitGamma(data, fit, 2), QDR_FIT_OK);
+    const long double s = std::log(5e299L) - (std::log(1e-300L) + std::log(1e300L)) / 2;
+    const long double k = fit[1];
+    EXPECT_NEAR(static_cast<double>((std::log(k) - boost::math::digamma(k)) / s), 1.0, 1e-13);
+    EXPECT_NEAR(fit[0] * fit[1] / 5e299, 1.0, 1e-14);
+}
+
 TEST(QdrFitGumbel, AgreesWithDirectMaximisationAndItsScoreEquations) {
     for (std::size_t count : {2u, 7u, 20u, 500u}) {
         const std::vector<double> data = extremeValueSample(count, 4.0, 0.75, count + 100);
