@@ -13,8 +13,8 @@ namespace vek::matrix_library {
 // not read. Returns 0 on success, or the 1-based position of the first eigenvalue that did not
 // settle within 30 QL iterations; the outputs are then unsorted and not to be used. A 0 x 0 input
 // gives empty outputs and 0; a matrix that is not square throws MatrixException. Accuracy:
-// |A v - lambda v| and |V'V - I| stay within a small multiple of n times 1e-16 times the
-// largest |lambda|, as for the published routines.
+// |A v - lambda v| within a small multiple of n * 1e-16 * max |lambda|, and |V'V - I| within a
+// small multiple of n * 1e-16, as for the published routines.
 //
 // Householder reduction to tridiagonal form with accumulated transformations (tred2, Press et al.,
 // Numerical Recipes, 2nd ed., 1992, section 11.2), then the QL algorithm with explicit shifts in
