@@ -39,6 +39,10 @@ constexpr double kEpsilon = 2.220446049250313e-16;
 constexpr double kAccuracy = std::max(5.0e-15, kEpsilon);
 constexpr double kLargeShape = 20.0;
 constexpr double kTemmeNearBand = 0.25e-3;
+// Within this distance |1 - x/a| the truncated Temme coefficients suffice.
+constexpr double kTemmeShortBand = 1.0e-3;
+// Outside this distance |1 - x/a| Temme's expansion gives way to the general methods.
+constexpr double kTemmeBand = 0.4;
 constexpr double kAsymptoticStart = 31.0;
 // Constants with the digits the published routine carries.
 constexpr double kLn10 = 2.30258509299405;
@@ -261,28 +265,31 @@ double fromScaledDensity(double a, double x, double scaledDensity) {
     return complement(asymptoticComplement(a, x, scaledDensity));
 }
 
+// c_k(eta) from row k of the coefficient table: all of its terms, or (truncated) the leading
+// ones that suffice next to x = a.
+template <std::size_t N>
+double temmeCoefficient(const std::array<double, N>& row, int rowIndex, bool truncated,
+                        double eta) {
+    const int used =
+        truncated ? incomplete_gamma_table::kShortLength[rowIndex] : static_cast<int>(N);
+    return polynomial(row, used, eta);
+}
+
 // Temme's expansion for large a and x/a near 1. `logRatio` is rlog(x/a); the leading factor
-// e^-(a rlog) and the erfc part are given by the caller, which differs between the general
-// band and the band next to x = a.
+// e^-(a rlog) and the erfc part come from the caller, which forms them differently in the band
+// next to x = a.
 double temmeExpansion(double a, double ratio, double logRatio, double leading, double erfcPart,
-                      bool nearTransition) {
+                      bool truncated) {
     using namespace incomplete_gamma_table;
     const double inverseShape = 1.0 / a;
     double eta = std::sqrt(logRatio + logRatio);
     if (ratio < 1.0) eta = -eta;
 
-    const auto length = [nearTransition](int row, int fullLength) {
-        return nearTransition ? kShortLength[row] : fullLength;
-    };
     const std::array<double, 8> rowValues = {
-        polynomial(kRow0, length(0, static_cast<int>(kRow0.size())), eta),
-        polynomial(kRow1, length(1, static_cast<int>(kRow1.size())), eta),
-        polynomial(kRow2, length(2, static_cast<int>(kRow2.size())), eta),
-        polynomial(kRow3, length(3, static_cast<int>(kRow3.size())), eta),
-        polynomial(kRow4, length(4, static_cast<int>(kRow4.size())), eta),
-        polynomial(kRow5, length(5, static_cast<int>(kRow5.size())), eta),
-        polynomial(kRow6, length(6, static_cast<int>(kRow6.size())), eta),
-        kRow7[0],
+        temmeCoefficient(kRow0, 0, truncated, eta), temmeCoefficient(kRow1, 1, truncated, eta),
+        temmeCoefficient(kRow2, 2, truncated, eta), temmeCoefficient(kRow3, 3, truncated, eta),
+        temmeCoefficient(kRow4, 4, truncated, eta), temmeCoefficient(kRow5, 5, truncated, eta),
+        temmeCoefficient(kRow6, 6, truncated, eta), kRow7[0],
     };
     const double series = polynomial(rowValues, static_cast<int>(rowValues.size()), inverseShape);
 
@@ -312,14 +319,15 @@ double largeShape(double a, double x) {
             (0.5 - std::sqrt(exponent) * complement(exponent / 3.0) / kSqrtPi) / leading;
         return temmeExpansion(a, ratio, logRatio, leading, erfcPart, true);
     }
-    if (std::fabs(distance) <= 0.4) {
+    if (std::fabs(distance) <= kTemmeBand) {
         if (std::fabs(distance) <= 2.0 * kEpsilon &&
             a * kEpsilon * kEpsilon > kIndeterminateBound) {
             return kInvalidArgument;
         }
         const double leading = std::exp(-exponent);
         const double erfcPart = 0.5 * erfc1(1, std::sqrt(exponent));
-        return temmeExpansion(a, ratio, logRatio, leading, erfcPart, std::fabs(distance) <= 1.0e-3);
+        return temmeExpansion(a, ratio, logRatio, leading, erfcPart,
+                              std::fabs(distance) <= kTemmeShortBand);
     }
 
     // r = e^-x x^a / Gamma(a) with Gamma from Stirling's series.

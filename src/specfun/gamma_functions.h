@@ -7,14 +7,15 @@ namespace kelstat {
 
 // ln Gamma(x) for x > 0 by Lanczos's approximation with g = 7 and nine terms, without
 // reflection. Exactly 0 at x = 1 and x = 2. No argument checks: x <= 0 gives whatever the
-// formula gives. Accuracy: about 1e-15 relative from x = 3 on and 1e-15 absolute from x = 0.5
-// on; below 0.5 the approximation weakens (about 1e-13 relative near 0.1).
+// formula gives. Accuracy (against 50-digit values): about 3e-15 absolute below x = 3, where the
+// relative error is unbounded next to the zeros at 1 and 2, and 2.5e-15 relative from 3 on.
 // Source: C. Lanczos, SIAM J. Numer. Anal. B 1 (1964) 86-96, with a fitted nine-term
 // coefficient set for g = 7.
 double XGAMMLN(double x);
 
-// Gamma(x) for x > 0 as exp(XGAMMLN(x)): exactly 1 at x = 1 and x = 2, about 14 significant
-// digits elsewhere up to the overflow point near 171.6 (where the result becomes +inf).
+// Gamma(x) for x > 0 as exp(XGAMMLN(x)): exactly 1 at x = 1 and x = 2; +inf from about 171.62
+// on. The absolute error of ln Gamma becomes a relative one, so the relative error is about
+// 3e-15 + 1e-16 |ln Gamma(x)| (4e-13 near x = 162).
 double XGAMMA(double x);
 
 // Regularized lower incomplete gamma function P(a, x) = gamma(a, x) / Gamma(a). Note the order
@@ -24,10 +25,13 @@ double XGAMMA(double x);
 // numerically indeterminate, give 2.0. a*x = 0 otherwise gives 0 when x <= a, else 1; x = +inf
 // with a finite gives 1. A NaN argument gives NaN, as would a series or continued fraction that
 // did not settle within its step limit (none is known to).
-// Accuracy: about 1e-14 absolute (14 significant digits of the smaller of P and 1 - P).
+// Accuracy: below 1e-14 absolute in every method's region (6.4e-15 worst in the tests, shapes
+// from 1e-8 to 1e9).
 // Source: DiDonato & Morris, "Computation of the incomplete gamma function ratios and their
 // inverse", ACM TOMS 12 (1986) 377-393, Algorithm 654, routine GRATIO at full accuracy
-// (IND = 0). Departure: Gamma(a) in the factor e^-x x^a / Gamma(a) (1 <= a < 20) is XGAMMA(a).
+// (IND = 0). Departures: Gamma(a) in the factor e^-x x^a / Gamma(a) (1 <= a < 20) is XGAMMA(a);
+// for x/a near 1, x/a - 1 is formed as (x - a)/a, so that large shapes near x = a keep their
+// digits (the rounded ratio alone costs up to 1e-13 for a in the millions).
 double mIncompleteGamma(double x, double a);
 
 // Derivatives of the incomplete gamma integral I(x, p) = P(p, x) for x > 0, p > 0, given

@@ -18,7 +18,8 @@ namespace kelstat {
 // ierr = 1: bad argument (x <= 0, n < 0, kode not 1 or 2, m < 1); ans is not written, except
 //           that a NaN x sets all m members to NaN.
 // ierr = 2: overflow, x too small for the order n + m - 1; nz = 0.
-// ierr = 3: n too large for the downward recurrence (more than 100 steps); nz = 0.
+// ierr = 3: orders too high for the downward recurrence (more than 100 steps); nz = 0. With
+//           IEEE double constants such orders always underflow first, so this cannot occur.
 // Accuracy: a few units of double rounding where the result is representable.
 // Source: D. E. Amos, "A portable Fortran subroutine for derivatives of the psi function",
 // ACM TOMS 9 (1983) 494-502, Algorithm 610 (DPSIFN): asymptotic expansion from a fitted
