@@ -434,7 +434,7 @@ ShapeDerivatives fractionInShape(double x, double p, double logX, double gplog, 
     first[3] = -x;
     double previous = value[2] / value[3];
     double step = 0.0;
-    double ratio = previous;
+    double ratio = 0.0;  // the latest convergent; set before any exit that uses it
 
     while (true) {
         partial -= 1.0;
