@@ -1,5 +1,6 @@
 #!/usr/bin/env python3
-"""Normal tolerance K-factors at 30 digits (mpmath). Writes tests/data/tolerance_normal_kfactors.csv.
+"""Normal tolerance K-factors at 32 digits (mpmath), printed to 25.
+Writes tests/data/tolerance_normal_kfactors.csv.
 
 one-sided: k = t'/sqrt(n), t' the (1 - alpha)-quantile of the noncentral t with n - 1 degrees of
   freedom and noncentrality z_p sqrt(n); its distribution function is integrated over the
@@ -10,6 +11,8 @@ two-sided: the root K = 1/t of G(t) = 2 I(t) - 1 + alpha, I(t) the 36-point Gaus
   the truncated 36-point definition itself, not the exact factor (they agree to about 1e-13).
 
 Run from the repository root: python3 tests/gen/tolerance_normal_reference.py
+It takes about an hour; to share it out, run parts with an output file and the sizes to do,
+e.g. `... /tmp/part.csv 3000 10000`, and concatenate the rows in size order.
 """
 import sys
 from mpmath import mp, mpf, sqrt, exp, log, loggamma, ncdf, npdf, quad, findroot, gammainc, \
@@ -98,7 +101,8 @@ def main():
     sizes = [int(a) for a in sys.argv[2:]] if len(sys.argv) > 2 else SIZES
     path = sys.argv[1] if len(sys.argv) > 1 else "tests/data/tolerance_normal_kfactors.csv"
     out = open(path, "w")
-    out.write("# Normal tolerance K-factors at 30 digits (tests/gen/tolerance_normal_reference.py):\n")
+    out.write("# Normal tolerance K-factors, mpmath at 32 digits, printed to 25 "
+              "(tests/gen/tolerance_normal_reference.py):\n")
     out.write("# one-sided from the noncentral t; two-sided from the 36-point definition on [0, 8.3]\n")
     out.write("n,confidence,proportion,one_sided,two_sided\n")
     for n in sizes:
