@@ -126,7 +126,7 @@ TEST(IncompleteGamma, MatchesReferenceTable) {
         const double a = row[0];
         const double x = row[1];
         const double error = std::fabs(mIncompleteGamma(x, a) - row[2]);
-        EXPECT_LE(error, 1e-13) << "a = " << a << ", x = " << x;
+        EXPECT_LE(error, 1e-14) << "a = " << a << ", x = " << x;
         worst = std::max(worst, error);
     }
     RecordProperty("worst_absolute_error", kelstat_test::scientific(worst));
@@ -147,7 +147,8 @@ std::vector<double> logGrid(double from, double to, int count) {
 }
 
 // Each regime keeps its points inside one method of the algorithm, so a fault in any of them
-// shows under its name. The oracle is Boost.Math in double precision (about 1e-15 here).
+// shows under its name. The oracle is Boost.Math in double precision (about 1e-15 here); the
+// bound is well inside the 1e-13 target so that a loss of digits in one method is caught.
 TEST(IncompleteGamma, EveryMethodAgainstBoost) {
     const std::vector<Regime> regimes = {
         {"a < 1, x < 1.1: series for P / x^a",
@@ -218,7 +219,7 @@ TEST(IncompleteGamma, EveryMethodAgainstBoost) {
                 worstPoint = {a, x};
             }
         }
-        EXPECT_LE(worst, 1e-13) << regime.name << ": worst at a = " << worstPoint[0]
+        EXPECT_LE(worst, 2e-14) << regime.name << ": worst at a = " << worstPoint[0]
                                 << ", x = " << worstPoint[1];
         RecordProperty(regime.name, kelstat_test::scientific(worst));
     }
