@@ -43,8 +43,10 @@ double qdr_GetNormalInvCdf(double p, double mean, double sd);
 double qdr_GetNormalPdf(double x, double mean, double sd);
 
 // Noncentral t quantile (lower tail): the t with P(T <= t) = p, T with df > 0 degrees of freedom
-// and noncentrality ncp (any finite sign and size, also in the thousands; 0 is the central t). p in
-// (0, 1); p = 0 and 1 give -inf and +inf; anything else NaN.
+// and noncentrality ncp (any finite sign and size, also in the thousands; 0 is the central t; an
+// infinite df gives ncp + z_p). p in (0, 1); p = 0 and 1 give -inf and +inf; anything else NaN.
+// Accurate to a few ulps for tail probabilities down to ~1e-12; NaN where it cannot be computed
+// (probabilities near the underflow threshold, or df of order 1 with |ncp| beyond 5000).
 double qdr_GetTInvCdf(double p, double df, double ncp);
 
 // Chi-square quantile (lower tail): the x with P(X <= x) = p, X with df > 0 degrees of freedom and
@@ -55,7 +57,8 @@ double qdr_GetChiSqInvCdf(double p, double df, double ncp);
 
 // Chi-square distribution function at x, df > 0, ncp >= 0: tail QDR_LOWER_TAIL (0) gives
 // P(X <= x), QDR_UPPER_TAIL (1) gives P(X > x); any other tail, or a bad parameter, gives NaN.
-// x <= 0 gives 0 (lower) or 1 (upper); x = +inf gives 1 or 0.
+// x <= 0 gives 0 (lower) or 1 (upper); x = +inf gives 1 or 0. The central case is the gamma
+// distribution function below (shape df/2, scale 2) with its accuracy.
 double qdr_GetChiSqCdf(int tail, double x, double df, double ncp);
 
 // Central chi-square density at x with df > 0 degrees of freedom (0 for x < 0); NaN otherwise.
@@ -64,6 +67,9 @@ double qdr_GetChiSqPdf(double x, double df);
 // Gamma distribution function of X = threshold + G, G with the given shape > 0 and scale > 0:
 // tail QDR_LOWER_TAIL (0) gives P(X <= x), QDR_UPPER_TAIL (1) gives P(X > x); bad arguments give
 // NaN. Note the parameter order: shape before scale, the location shift (threshold) last.
+// Whole shapes up to 50 use the finite Poisson sum (a few ulps in both tails); other shapes stay
+// within about twice the function's own conditioning, z f(z) / tail ulps for z = x - threshold in
+// scale units (tens of ulps for tails near 1e-15 at large shapes).
 double qdr_GetGammaCdf(int tail, double x, double shape, double scale, double threshold);
 
 // Logistic quantile: location + scale * ln(p / (1 - p)); p in [0, 1] (0 and 1 give -inf and
