@@ -8,7 +8,7 @@ one-sided: k = t'/sqrt(n), t' the (1 - alpha)-quantile of the noncentral t with 
 two-sided: the root K = 1/t of G(t) = 2 I(t) - 1 + alpha, I(t) the 36-point Gauss-Legendre sum
   over [0, 8.3] of Q((n-1)/2, (n-1) r^2(x) t^2 / 2) phi(x), where r^2(x) solves
   Phi(r - x/sqrt(n)) - Phi(-r - x/sqrt(n)) = p. Nodes are Newton-refined roots of P_36. This is
-  the truncated 36-point definition itself, not the exact factor (they agree to about 1e-13).
+  the truncated 36-point definition itself, not the exact (untruncated) factor.
 
 Run from the repository root: python3 tests/gen/tolerance_normal_reference.py
 It takes about an hour; to share it out, run parts with an output file and the sizes to do,
