@@ -67,7 +67,7 @@ double qdr_GetChiSqPdf(double x, double df);
 // Gamma distribution function of X = threshold + G, G with the given shape > 0 and scale > 0:
 // tail QDR_LOWER_TAIL (0) gives P(X <= x), QDR_UPPER_TAIL (1) gives P(X > x); bad arguments give
 // NaN. Note the parameter order: shape before scale, the location shift (threshold) last.
-// Whole shapes up to 50 use the finite Poisson sum (a few ulps in both tails); other shapes stay
+// Whole and half-whole shapes up to 50 use finite sums (a few ulps in both tails); others stay
 // within about twice the function's own conditioning, z f(z) / tail ulps for z = x - threshold in
 // scale units (tens of ulps for tails near 1e-15 at large shapes).
 double qdr_GetGammaCdf(int tail, double x, double shape, double scale, double threshold);

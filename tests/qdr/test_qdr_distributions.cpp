@@ -123,18 +123,19 @@ TEST(QdrChiSquare, CentralFunctionsMatchFiftyDigitValues) {
     EXPECT_EQ(qdr_GetChiSqPdf(0.0, 2.0), 0.5);
 }
 
-// Integer shapes up to 50 take a finite sum, good to a few ulps in both tails on either side of
-// the median; the rest go to the incomplete gamma function, held to the conditioning budget.
+// Whole and half-whole shapes up to 50 take a finite sum, good to a few ulps in both tails on
+// either side of the median; the rest go to the incomplete gamma function, held to the
+// conditioning budget.
 TEST(QdrGamma, DistributionFunctionMatchesFiftyDigitValuesInBothTails) {
     double worstFiniteSum = 0.0;
     double worstGeneral = 0.0;
-    for (double shape :
-         {1.0, 2.0, 3.0, 5.0, 10.0, 20.0, 21.0, 35.0, 50.0, 51.0, 0.3, 2.5, 200.0, 1e4}) {
+    for (double shape : {0.5,  1.0,  1.5,  2.0,  3.0,  4.5,  5.0, 10.0, 20.0,  20.5,
+                         21.0, 35.0, 49.5, 50.0, 50.5, 51.0, 0.3, 2.25, 200.0, 1e4}) {
         for (double ratio : {1e-6, 0.1, 0.5, 0.8, 0.97, 1.0, 1.03, 1.3, 2.0, 5.0, 30.0}) {
             const double z = ratio * shape;
             const Wide lower = boost::math::gamma_p(Wide(shape), Wide(z), QuietPolicy());
             const Wide upper = boost::math::gamma_q(Wide(shape), Wide(z), QuietPolicy());
-            const bool finiteSum = shape <= 50.0 && std::floor(shape) == shape;
+            const bool finiteSum = shape <= 50.0 && std::floor(2.0 * shape) == 2.0 * shape;
             auto error = [&](double value, const Wide& exact) {
                 return finiteSum ? ulpsFrom(value, exact) : conditionedUlps(value, exact, shape, z);
             };
