@@ -60,13 +60,23 @@ TEST(ParametricEntryTest, CodesPastTheLastFamilySelectTheNormalModel) {
     }
 }
 
-TEST(ParametricEntryTest, FamiliesNotYetAvailableGiveNaNAndCodeZero) {
-    for (uint32_t code = 3; code <= 8; ++code) {
+// Codes 3 to 8 select families that are wired one by one; whichever state a family is in (its
+// model, or NaN results while it is not available), every output is overwritten and the inputs
+// are left alone.
+TEST(ParametricEntryTest, EveryFamilyOverwritesEveryOutput) {
+    for (uint32_t code = 0; code <= 8; ++code) {
         kel_ParametricTIData record = parametricRequest(code, kel_TwoSided);
-        EXPECT_EQ(kel_CalcParametricToleranceInterval(kSample.data(), 10, &record), 0);
-        for (double value : outputsOf(record)) EXPECT_TRUE(isQuietNaN(value)) << code;
+        const kel_ParametricTIData stale = record;
+        kel_CalcParametricToleranceInterval(kSample.data(), 10, &record);
+        const std::vector<double> before = outputsOf(stale);
+        const std::vector<double> after = outputsOf(record);
+        for (size_t i = 0; i < after.size(); ++i) {
+            EXPECT_NE(bitsOf(after[i]), bitsOf(before[i])) << code << " field " << i;
+        }
         EXPECT_EQ(record.distribution, code);
+        EXPECT_EQ(record.confidenceType, kel_TwoSided);
         EXPECT_EQ(record.confidenceLevel, 0.95);
+        EXPECT_EQ(record.proportion, 0.90);
     }
 }
 
