@@ -3,6 +3,8 @@
 #include <memory>
 
 #include "kelstat.h"
+#include "tolerance/exponential_model.h"
+#include "tolerance/logistic_models.h"
 #include "tolerance/lognormal_gamma_models.h"
 #include "tolerance/nonparametric.h"
 #include "tolerance/normal_model.h"
@@ -31,10 +33,16 @@ std::unique_ptr<ToleranceInterval> makeModel(uint32_t distribution, const double
         case KEL_DIST_WEIBULL:
         case KEL_DIST_SMALLEST_EXTREME_VALUE:
         case KEL_DIST_LARGEST_EXTREME_VALUE:
-        case KEL_DIST_EXPONENTIAL:
-        case KEL_DIST_LOGLOGISTIC:
-        case KEL_DIST_LOGISTIC:
             return nullptr;
+        case KEL_DIST_EXPONENTIAL:
+            return std::make_unique<ExponentialModelTI>(data, count, kInitialAlpha,
+                                                        kInitialProportion, kel_TwoSided);
+        case KEL_DIST_LOGLOGISTIC:
+            return std::make_unique<LogLogisticModelTI>(data, count, kInitialAlpha,
+                                                        kInitialProportion, kel_TwoSided);
+        case KEL_DIST_LOGISTIC:
+            return std::make_unique<LogisticModelTI>(data, count, kInitialAlpha,
+                                                     kInitialProportion, kel_TwoSided);
         default:
             return std::make_unique<NormalModelTI>(data, count, kInitialAlpha, kInitialProportion,
                                                    kel_TwoSided);
