@@ -259,18 +259,21 @@ typedef struct kel_NonParametricTIData {
  *       maximum-likelihood gamma shape, scale = the gamma scale; both NaN when every observation
  *       is equal. The code is that of the gamma fit (below);
  *   3 to 8 (Weibull, smallest and largest extreme value, exponential, log-logistic, logistic):
- *       not available in this version: every output NaN, code 0.
+ *       each family's own model; a family this build does not provide writes every output NaN
+ *       and returns 0.
  *
  * Written, whatever the code: location, scale, lowerLimit, upperLimit, lowerKFactor,
  * upperKFactor, auxiliary[0..1]. For a one-sided request both limit fields hold the one bound
  * asked for, and the other K-factor is NaN; for a confidenceType outside -1..1 both K-factors and
- * both limits are NaN and the estimates are still set. auxiliary is NaN for every model
- * available here. With fewer than two observations, K-factors and limits are NaN (and with none,
- * the estimates as well).
+ * both limits are NaN and the estimates are still set. auxiliary holds the exponential model's
+ * two scale-ratio bounds of a two-sided request and is NaN otherwise. With fewer than two
+ * observations, K-factors and limits are NaN (and with none, the estimates as well).
  *
- * Returns 0, or for the gamma model the code of its maximum-likelihood fit passed on unchanged:
- *   1 fewer than two observations, 2 a non-finite or non-positive observation, 3 all
- *   observations equal, 4 no convergence, 5 invalid argument.
+ * Returns 0, or for a model that fits its parameters by maximum likelihood (gamma, and the
+ * extreme-value and logistic families) the code of that fit, passed on unchanged:
+ *   1 fewer than two observations, 2 a non-finite observation or one outside the distribution's
+ *   support (for the gamma: not positive), 3 all observations equal, 4 no convergence,
+ *   5 invalid argument.
  * A non-zero code does not stop the computation: K-factors and limits are still formed and
  * written; the caller decides what the code means.
  *
