@@ -4,6 +4,7 @@
 
 #include "kelstat.h"
 #include "tolerance/exponential_model.h"
+#include "tolerance/extreme_value_models.h"
 #include "tolerance/logistic_models.h"
 #include "tolerance/lognormal_gamma_models.h"
 #include "tolerance/nonparametric.h"
@@ -31,9 +32,14 @@ std::unique_ptr<ToleranceInterval> makeModel(uint32_t distribution, const double
             return std::make_unique<GammaModelTI>(data, count, kInitialAlpha, kInitialProportion,
                                                   kel_TwoSided);
         case KEL_DIST_WEIBULL:
+            return std::make_unique<WeibullModelTI>(data, count, kInitialAlpha, kInitialProportion,
+                                                    kel_TwoSided);
         case KEL_DIST_SMALLEST_EXTREME_VALUE:
+            return std::make_unique<SExtremeValueModelTI>(data, count, kInitialAlpha,
+                                                          kInitialProportion, kel_TwoSided);
         case KEL_DIST_LARGEST_EXTREME_VALUE:
-            return nullptr;
+            return std::make_unique<LExtremeValueModelTI>(data, count, kInitialAlpha,
+                                                          kInitialProportion, kel_TwoSided);
         case KEL_DIST_EXPONENTIAL:
             return std::make_unique<ExponentialModelTI>(data, count, kInitialAlpha,
                                                         kInitialProportion, kel_TwoSided);

@@ -1,0 +1,639 @@
+#include "tolerance/extreme_value_models.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstddef>
+#include <limits>
+#include <utility>
+
+#include "numerics/gauss_legendre.h"
+#include "numerics/golden_section.h"
+#include "numerics/root_finder.h"
+#include "qdr.h"
+#include "tolerance/gauss_legendre_120_table.h"
+
+namespace kelstat {
+
+namespace {
+
+constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
+constexpr double kInfinity = std::numeric_limits<double>::infinity();
+
+// g below this (its peak is near 1 for a fitted sample) adds nothing the root can see.
+constexpr double kNegligibleDensity = 1e-12;
+
+// The peak of g lies near z = 1 for fitted residuals; the first search spans far beyond it, the
+// retry a narrower interval for samples whose wide search lands on a flat tail.
+constexpr double kModeSearchLow = 0.001;
+constexpr double kModeSearchHigh = 8.0;
+constexpr double kModeRetryLow = 0.1;
+constexpr double kModeRetryHigh = 4.0;
+
+constexpr double kFineStep = 0.1;
+constexpr double kGridStep = 0.5;
+constexpr double kGridTop = 7.5;
+constexpr double kGridBottomStart = 0.501;
+constexpr double kGridFloor = 0.001;
+constexpr double kAscentCeiling = 15.0;
+
+// The upward grid scan ends where g first reaches 1e-12; g decays like exp(-n max(a) z), so a
+// fitted sample stops within a few steps. A scan still climbing at z = 100 has residuals for
+// which no range exists: NaN.
+constexpr int kMaxUpwardGridSteps = 200;
+
+// Bracket search: 52 steps of 0.5, then 100 of 25, then doubling. F runs from alpha to alpha - 1
+// over the reals, so a sign change comes long before the doubling steps overflow (about step
+// 1170); a search still going by this cap never finds one: NaN.
+constexpr int kHalfUnitSteps = 52;
+constexpr int kWideSteps = 100;
+constexpr double kFirstStep = 0.5;
+constexpr double kWideStep = 25.0;
+constexpr int kMaxBracketSteps = 1200;
+
+// S(z), each term divided by n before it is added, in the order of the residuals.
+double meanExponential(const std::vector<double>& residuals, double z) {
+    const double n = static_cast<double>(residuals.size());
+    double sum = 0.0;
+    for (const double residual : residuals) sum = sum + std::exp(residual * z) / n;
+    return sum;
+}
+
+// g(z) from S(z) = mean, with the grouping of the closed form.
+double densityFromMean(double n, double sumOfResiduals, double z, double mean) {
+    if (n >= 3.0) {
+        if (!(z > 0.0)) return 0.0;
+        return std::exp(sumOfResiduals * (z - 1.0)) * std::pow(z / mean, n) / (z * z);
+    }
+    if (n == 2.0) return std::exp(sumOfResiduals * (z - 1.0)) / (mean * mean);
+    return 0.0;
+}
+
+double density(const std::vector<double>& residuals, double sumOfResiduals, double z) {
+    const double n = static_cast<double>(residuals.size());
+    if (n < 2.0 || (n >= 3.0 && !(z > 0.0))) return 0.0;
+    return densityFromMean(n, sumOfResiduals, z, meanExponential(residuals, z));
+}
+
+// P(Gamma(n, 1) <= -ln(p) exp(-k z) n S(z)).
+double coverageProbability(double minusLogProportion, double k, double z, double n, double mean) {
+    const double x = minusLogProportion * std::exp(-k * z) * n * mean;
+    return qdr_GetGammaCdf(QDR_LOWER_TAIL, x, n, 1.0, 0.0);
+}
+
+// --- Logarithmic form of g ------------------------------------------------------------------
+//
+// For a few thousand observations and more, exp(c (z - 1)) overflows where (z / S)^n underflows
+// and the closed form gives NaN, although g itself is moderate (its peak is near 1 for fitted
+// residuals). There the equation is evaluated from ln g instead, shifted by ln g at the mode so
+// that the peak is 1: the shift cancels between g and its integral I.
+
+struct ResidualSummary {
+    const std::vector<double>* residuals;
+    double sum;
+    double largest;
+    double smallest;
+};
+
+ResidualSummary summarize(const std::vector<double>& residuals, double sumOfResiduals) {
+    ResidualSummary summary{&residuals, sumOfResiduals, -kInfinity, kInfinity};
+    for (const double residual : residuals) {
+        summary.largest = std::max(summary.largest, residual);
+        summary.smallest = std::min(summary.smallest, residual);
+    }
+    return summary;
+}
+
+// ln S(z): from S itself while it is a normal number, else with the largest exponent factored out.
+double logMeanExponential(const ResidualSummary& summary, double z, double mean) {
+    if (std::isnormal(mean)) return std::log(mean);
+    const double top = z > 0.0 ? summary.largest * z : summary.smallest * z;
+    if (!std::isfinite(top)) return std::log(mean);
+    const double n = static_cast<double>(summary.residuals->size());
+    double sum = 0.0;
+    for (const double residual : *summary.residuals) sum = sum + std::exp(residual * z - top);
+    return top + std::log(sum / n);
+}
+
+double logDensityFromMean(const ResidualSummary& summary, double z, double mean) {
+    const double n = static_cast<double>(summary.residuals->size());
+    if (n >= 3.0) {
+        if (!(z > 0.0)) return -kInfinity;
+        const double logZ = std::log(z);
+        return summary.sum * (z - 1.0) + n * (logZ - logMeanExponential(summary, z, mean)) -
+               2.0 * logZ;
+    }
+    if (n == 2.0) return summary.sum * (z - 1.0) - 2.0 * logMeanExponential(summary, z, mean);
+    return -kInfinity;
+}
+
+double logDensity(const ResidualSummary& summary, double z) {
+    return logDensityFromMean(summary, z, meanExponential(*summary.residuals, z));
+}
+
+// -ln g, whose minimum is the mode of g. Unlike g it has no flat underflowed tails that would
+// mislead the golden-section search.
+class NegatedLogDensity : public ZRXRealFunction {
+  public:
+    explicit NegatedLogDensity(const ResidualSummary& summary) : mSummary(summary) {}
+    double operator()(double z) override { return -logDensity(mSummary, z); }
+
+  private:
+    ResidualSummary mSummary;
+};
+
+// --- Integration range ------------------------------------------------------------------------
+
+// Moves the lower end down from start in steps of 0.1 while g stays above the threshold; ends at
+// 0 at the latest. The start is at most the grid cap, so the loop is bounded.
+template <class Density>
+void descendLower(Density& g, double start, double* lower) {
+    *lower = start;
+    double z = start;
+    while (z > 0.0) {
+        if (!(g(z) > kNegligibleDensity)) break;
+        z = z - kFineStep;
+        *lower = z;
+    }
+    if (*lower < 0.0) *lower = 0.0;
+}
+
+// Moves the upper end up from start in steps of 0.1 while g stays above the threshold, never past
+// the first step that reaches 15.
+template <class Density>
+void ascendUpper(Density& g, double n, double start, double* upper) {
+    *upper = start;
+    double z = start;
+    while (!(n >= 3.0 && z <= 0.0) && z < kAscentCeiling && g(z) > kNegligibleDensity) {
+        z = z + kFineStep;
+        *upper = z;
+    }
+}
+
+// The range around a mode m found by a search (NaN when the search failed), for n >= 3.
+template <class Density>
+void rangeFromMode(Density& g, double n, double mode, double* lower, double* upper) {
+    if (std::isnan(mode)) {
+        *lower = kModeSearchLow;
+        *upper = kModeSearchHigh;
+        return;
+    }
+    if (mode > 0.0 && !(g(mode) <= kNegligibleDensity)) {
+        descendLower(g, mode - kFineStep, lower);
+        ascendUpper(g, n, mode + kFineStep, upper);
+        return;
+    }
+    // The search missed the peak: find where g is not negligible on a coarse grid.
+    double z = kGridTop;
+    for (;;) {
+        *upper = z;
+        if (!(z > kGridFloor && g(z) < kNegligibleDensity)) break;
+        z = z - kGridStep;
+    }
+    z = kGridBottomStart;
+    for (int step = 0;; ++step) {
+        *lower = z;
+        if (!(z <= 0.0 || g(z) < kNegligibleDensity)) break;
+        if (step == kMaxUpwardGridSteps) {
+            *lower = kNaN;
+            *upper = kNaN;
+            return;
+        }
+        z = z + kGridStep;
+    }
+    const double firstDense = z;
+    if (*upper < kGridFloor) {
+        *upper = firstDense;
+        *lower = kGridFloor;
+        descendLower(g, kGridFloor, lower);
+    } else {
+        descendLower(g, firstDense, lower);
+    }
+    ascendUpper(g, n, *upper, upper);
+}
+
+// --- The equation with S and g at the quadrature points computed once --------------------------
+
+struct EquationSetup {
+    std::vector<double> residuals;
+    double sumOfResiduals = 0.0;
+    double lower = kNaN;
+    double upper = kNaN;
+    double normalizingConstant = kNaN;
+    std::vector<double> nodes;
+    std::vector<double> weights;
+    SevNodeValues values;
+};
+
+// S and g (direct or shifted logarithmic form) at the 120 points, formed as the quadrature routine
+// forms them; returns the integral of g over [lower, upper] with the routine's arithmetic, or NaN
+// as soon as one direct value is not finite (the integral could only be so too).
+double fillNodeValues(EquationSetup& setup, const ResidualSummary* logarithmic, double shift) {
+    const double n = static_cast<double>(setup.residuals.size());
+    const double half = 0.5 * (setup.upper - setup.lower);
+    const double mid = 0.5 * (setup.lower + setup.upper);
+    const std::size_t pairs = std::min(setup.nodes.size(), setup.weights.size());
+    SevNodeValues& values = setup.values;
+    values.points.assign(2 * pairs, kNaN);
+    values.means.assign(2 * pairs, kNaN);
+    values.densities.assign(2 * pairs, kNaN);
+    for (std::size_t pair = 0; pair < pairs; ++pair) {
+        const double offset = setup.nodes[pair] * half;
+        const double points[2] = {mid + offset, mid - offset};
+        for (std::size_t side = 0; side < 2; ++side) {
+            const double z = points[side];
+            const double mean = meanExponential(setup.residuals, z);
+            double g = 0.0;
+            if (logarithmic == nullptr) {
+                g = densityFromMean(n, setup.sumOfResiduals, z, mean);
+                if (!std::isfinite(g)) return kNaN;
+            } else {
+                g = std::exp(logDensityFromMean(*logarithmic, z, mean) - shift);
+            }
+            values.points[2 * pair + side] = z;
+            values.means[2 * pair + side] = mean;
+            values.densities[2 * pair + side] = g;
+        }
+    }
+    double sum = 0.0;
+    for (std::size_t pair = 0; pair < pairs; ++pair) {
+        sum = sum +
+              setup.weights[pair] * (values.densities[2 * pair] + values.densities[2 * pair + 1]);
+    }
+    return half * sum;
+}
+
+bool usableIntegral(double integral) {
+    return std::isfinite(integral) && std::isfinite(1.0 / integral);
+}
+
+// The range of the logarithmic form and its shift (ln g at the mode, 0 when that fails).
+void logarithmicRange(const ResidualSummary& summary, double* lower, double* upper, double* shift) {
+    const double n = static_cast<double>(summary.residuals->size());
+    *shift = 0.0;
+    *lower = 0.0;
+    double mode = kNaN;
+    if (n >= 3.0) {
+        NegatedLogDensity negated(summary);
+        mode = calcGoldenSection(kModeSearchLow, kModeSearchHigh, negated, false);
+        const double peak = std::isnan(mode) ? kNaN : logDensity(summary, mode);
+        if (std::isfinite(peak)) *shift = peak;
+    }
+    const double offset = *shift;
+    auto g = [&summary, offset](double z) { return std::exp(logDensity(summary, z) - offset); };
+    if (n <= 2.0) {
+        ascendUpper(g, n, kFineStep, upper);
+        return;
+    }
+    rangeFromMode(g, n, mode, lower, upper);
+}
+
+// Range, node values and normalising constant: the direct form where its integral is finite,
+// else the logarithmic one. False when no range exists.
+bool prepareEquation(const SExtremeValueModelTI& model, EquationSetup& setup, bool* logarithmic) {
+    *logarithmic = false;
+    model.calcIntegrationLimits(setup.residuals, setup.sumOfResiduals, &setup.lower, &setup.upper);
+    if (std::isnan(setup.lower) || std::isnan(setup.upper)) return false;
+    double integral = fillNodeValues(setup, nullptr, 0.0);
+    if (!usableIntegral(integral)) {
+        *logarithmic = true;
+        const ResidualSummary summary = summarize(setup.residuals, setup.sumOfResiduals);
+        double shift = 0.0;
+        logarithmicRange(summary, &setup.lower, &setup.upper, &shift);
+        if (std::isnan(setup.lower) || std::isnan(setup.upper)) return false;
+        integral = fillNodeValues(setup, &summary, shift);
+    }
+    setup.normalizingConstant = 1.0 / integral;
+    return true;
+}
+
+// --- Root ------------------------------------------------------------------------------------
+
+// The noncentral-t start: the one-sided normal-theory factor on the log-log scale.
+double startingPoint(double n, double alphaLevel, double proportion) {
+    const double noncentrality = -std::sqrt(n) * std::log(-std::log(proportion));
+    const double t = qdr_GetTInvCdf(1.0 - alphaLevel, n - 1.0, noncentrality);
+    return -t / std::sqrt(n - 1.0);
+}
+
+// Brackets the root from x0 and solves; x0 itself when F is 0 or NaN there.
+double solveFromStart(SExtremeKFactorIntegralFunction& equation, double x0) {
+    const double f0 = equation(x0);
+    if (!(f0 < 0.0) && !(f0 > 0.0)) return x0;
+    const bool downward = f0 < 0.0;
+    double previous = x0;
+    double step = kFirstStep;
+    double x = downward ? x0 - step : x0 + step;
+    for (int steps = 1;; ++steps) {
+        const double f = equation(x);
+        if (downward ? !(f < 0.0) : !(f > 0.0)) break;
+        if (steps == kMaxBracketSteps) return kNaN;
+        // The move just made was number `steps`; the next one is steps + 1.
+        if (steps + 1 > kHalfUnitSteps + kWideSteps) {
+            step = step + step;
+        } else if (steps + 1 > kHalfUnitSteps) {
+            step = kWideStep;
+        }
+        previous = x;
+        x = downward ? x - step : x + step;
+    }
+    return downward ? ZRXRootFinder(x, previous, equation) : ZRXRootFinder(previous, x, equation);
+}
+
+void residualsOf(const std::vector<double>& data, double location, double scale,
+                 std::vector<double>& residuals, double& sumOfResiduals) {
+    residuals.resize(data.size());
+    sumOfResiduals = 0.0;
+    for (std::size_t i = 0; i < data.size(); ++i) {
+        residuals[i] = (data[i] - location) / scale;
+        sumOfResiduals = sumOfResiduals + residuals[i];
+    }
+}
+
+}  // namespace
+
+// --- Function objects -------------------------------------------------------------------------
+
+SEVKFNormalizingConstIntegrand::SEVKFNormalizingConstIntegrand(double sumOfResiduals,
+                                                               std::vector<double> residuals,
+                                                               double multiplier)
+    : mSumOfResiduals(sumOfResiduals), mResiduals(std::move(residuals)), mMultiplier(multiplier) {}
+
+double SEVKFNormalizingConstIntegrand::operator()(double z) {
+    return mMultiplier * density(mResiduals, mSumOfResiduals, z);
+}
+
+SExtremeKFactorIntegrand::SExtremeKFactorIntegrand(double proportion, double k,
+                                                   double sumOfResiduals,
+                                                   double normalizingConstant,
+                                                   std::vector<double> residuals)
+    : mProportion(proportion),
+      mK(k),
+      mSumOfResiduals(sumOfResiduals),
+      mNormalizingConstant(normalizingConstant),
+      mResiduals(std::move(residuals)) {}
+
+double SExtremeKFactorIntegrand::operator()(double z) {
+    const double n = static_cast<double>(mResiduals.size());
+    const double mean = meanExponential(mResiduals, z);
+    const double coverage = coverageProbability(-std::log(mProportion), mK, z, n, mean);
+    return (mNormalizingConstant * coverage) * densityFromMean(n, mSumOfResiduals, z, mean);
+}
+
+SExtremeKFactorIntegralFunction::SExtremeKFactorIntegralFunction(
+    std::vector<double> residuals, double proportion, double alphaLevel, double sumOfResiduals,
+    double normalizingConstant, double lowerIntegrationLimit, double upperIntegrationLimit,
+    std::vector<double> nodes, std::vector<double> weights)
+    : mResiduals(std::move(residuals)),
+      mProportion(proportion),
+      mAlpha(alphaLevel),
+      mSumOfResiduals(sumOfResiduals),
+      mNormalizingConstant(normalizingConstant),
+      mLowerIntegrationLimit(lowerIntegrationLimit),
+      mUpperIntegrationLimit(upperIntegrationLimit),
+      mNodes(std::move(nodes)),
+      mWeights(std::move(weights)),
+      mRecentK{kNaN, kNaN},
+      mRecentValue{kNaN, kNaN} {}
+
+double SExtremeKFactorIntegralFunction::operator()(double k) {
+    if (mNodeValues == nullptr) return evaluateAfresh(k);
+    for (int slot = 0; slot < 2; ++slot) {
+        if (mRecentK[slot] == k) return mRecentValue[slot];
+    }
+    const double value = evaluateFromNodeValues(k);
+    mRecentK[1] = mRecentK[0];
+    mRecentValue[1] = mRecentValue[0];
+    mRecentK[0] = k;
+    mRecentValue[0] = value;
+    return value;
+}
+
+double SExtremeKFactorIntegralFunction::evaluateAfresh(double k) {
+    SExtremeKFactorIntegrand integrand(mProportion, k, mSumOfResiduals, mNormalizingConstant,
+                                       mResiduals);
+    const double integral = calcGaussianIntegration(mLowerIntegrationLimit, mUpperIntegrationLimit,
+                                                    mNodes, mWeights, integrand);
+    return (integral + (-1.0)) + mAlpha;
+}
+
+double SExtremeKFactorIntegralFunction::evaluateFromNodeValues(double k) const {
+    const double n = static_cast<double>(mResiduals.size());
+    const double minusLogProportion = -std::log(mProportion);
+    const double half = 0.5 * (mUpperIntegrationLimit - mLowerIntegrationLimit);
+    const std::vector<double>& points = mNodeValues->points;
+    const std::vector<double>& means = mNodeValues->means;
+    const std::vector<double>& densities = mNodeValues->densities;
+    const std::size_t pairs = std::min(mWeights.size(), points.size() / 2);
+    double sum = 0.0;
+    for (std::size_t pair = 0; pair < pairs; ++pair) {
+        const std::size_t right = 2 * pair;
+        const std::size_t left = right + 1;
+        const double rightValue =
+            (mNormalizingConstant *
+             coverageProbability(minusLogProportion, k, points[right], n, means[right])) *
+            densities[right];
+        const double leftValue =
+            (mNormalizingConstant *
+             coverageProbability(minusLogProportion, k, points[left], n, means[left])) *
+            densities[left];
+        sum = sum + mWeights[pair] * (rightValue + leftValue);
+    }
+    const double integral = half * sum;
+    return (integral + (-1.0)) + mAlpha;
+}
+
+SevIntegrationRange sevIntegrationRange(const std::vector<double>& residuals) {
+    SExtremeValueModelTI model(nullptr, 0, 0.05, 0.95, kel_TwoSided);
+    EquationSetup setup;
+    setup.residuals = residuals;
+    for (const double residual : residuals) {
+        setup.sumOfResiduals = setup.sumOfResiduals + residual;
+    }
+    model.getGaussLegendreWeights(setup.nodes, setup.weights);
+    bool logarithmic = false;
+    if (!prepareEquation(model, setup, &logarithmic)) return {kNaN, kNaN, logarithmic};
+    return {setup.lower, setup.upper, logarithmic};
+}
+
+// --- SExtremeValueModelTI ---------------------------------------------------------------------
+
+SExtremeValueModelTI::SExtremeValueModelTI(const double* observations, uint32_t count,
+                                           double alphaLevel, double proportionToCover,
+                                           kel_ConfidenceType type)
+    : ToleranceInterval(observations, count, alphaLevel, proportionToCover, type) {}
+
+int32_t SExtremeValueModelTI::estimateTIBasedParameters() {
+    double fit[2] = {0.0, 0.0};
+    const int32_t code = qdr_FitGumbel(data.data(), fit, sampleSize, 0);
+    location = fit[0];
+    scale = fit[1];
+    return code;
+}
+
+void SExtremeValueModelTI::getGaussLegendreWeights(std::vector<double>& nodes,
+                                                   std::vector<double>& weights) const {
+    nodes.assign(kGaussLegendre120Nodes, kGaussLegendre120Nodes + kGaussLegendre120Pairs);
+    weights.assign(kGaussLegendre120Weights, kGaussLegendre120Weights + kGaussLegendre120Pairs);
+}
+
+void SExtremeValueModelTI::calcIntegrationLimits(const std::vector<double>& residuals,
+                                                 double sumOfResiduals, double* lower,
+                                                 double* upper) const {
+    const double n = static_cast<double>(residuals.size());
+    SEVKFNormalizingConstIntegrand integrand(sumOfResiduals, residuals, 1.0);
+    auto g = [&integrand](double z) { return integrand(z); };
+    *lower = 0.0;
+    if (n <= 2.0) {
+        ascendUpper(g, n, kFineStep, upper);
+        return;
+    }
+    integrand.setMultiplier(-1.0);
+    double mode = calcGoldenSection(kModeSearchLow, kModeSearchHigh, integrand, false);
+    if (std::fabs(density(residuals, sumOfResiduals, mode)) <= kNegligibleDensity) {
+        mode = calcGoldenSection(kModeRetryLow, kModeRetryHigh, integrand, false);
+    }
+    integrand.setMultiplier(1.0);
+    rangeFromMode(g, n, mode, lower, upper);
+}
+
+void SExtremeValueModelTI::calcLowerKFactor(double alphaLevel, double proportionToCover, double& k,
+                                            int sign, SevEvaluation evaluation) const {
+    k = kNaN;
+    EquationSetup setup;
+    getGaussLegendreWeights(setup.nodes, setup.weights);
+    if (sampleSize < 2 || std::isnan(location) || std::isnan(scale)) return;
+    residualsOf(data, location, scale, setup.residuals, setup.sumOfResiduals);
+    const double n = static_cast<double>(sampleSize);
+
+    if (evaluation == SevEvaluation::kStraightforward) {
+        calcIntegrationLimits(setup.residuals, setup.sumOfResiduals, &setup.lower, &setup.upper);
+        if (std::isnan(setup.lower) || std::isnan(setup.upper)) return;
+        SEVKFNormalizingConstIntegrand g(setup.sumOfResiduals, setup.residuals, 1.0);
+        const double integral =
+            calcGaussianIntegration(setup.lower, setup.upper, setup.nodes, setup.weights, g);
+        SExtremeKFactorIntegralFunction equation(setup.residuals, proportionToCover, alphaLevel,
+                                                 setup.sumOfResiduals, 1.0 / integral, setup.lower,
+                                                 setup.upper, setup.nodes, setup.weights);
+        k = sign * solveFromStart(equation, startingPoint(n, alphaLevel, proportionToCover));
+        return;
+    }
+
+    bool logarithmic = false;
+    if (!prepareEquation(*this, setup, &logarithmic)) return;
+    SExtremeKFactorIntegralFunction equation(setup.residuals, proportionToCover, alphaLevel,
+                                             setup.sumOfResiduals, setup.normalizingConstant,
+                                             setup.lower, setup.upper, setup.nodes, setup.weights);
+    equation.useNodeValues(&setup.values);
+    k = sign * solveFromStart(equation, startingPoint(n, alphaLevel, proportionToCover));
+}
+
+void SExtremeValueModelTI::calcKFactors() {
+    const double lowerAlpha = alpha * 0.5;
+    const double lowerProportion = (proportion + 1.0) * 0.5;
+    const double upperAlpha = 1.0 - alpha * 0.5;
+    const double upperProportion = 1.0 - (proportion + 1.0) * 0.5;
+    lowerKFactor = kNaN;
+    upperKFactor = kNaN;
+    if (sampleSize < 2 || std::isnan(location) || std::isnan(scale)) return;
+
+    // Range, normalising integral and node values depend on the residuals only: shared.
+    EquationSetup setup;
+    getGaussLegendreWeights(setup.nodes, setup.weights);
+    residualsOf(data, location, scale, setup.residuals, setup.sumOfResiduals);
+    bool logarithmic = false;
+    if (!prepareEquation(*this, setup, &logarithmic)) return;
+    const double n = static_cast<double>(sampleSize);
+    const std::pair<double, double> requests[2] = {{lowerAlpha, lowerProportion},
+                                                   {upperAlpha, upperProportion}};
+    double* factors[2] = {&lowerKFactor, &upperKFactor};
+    const int signs[2] = {-1, 1};
+    for (int side = 0; side < 2; ++side) {
+        SExtremeKFactorIntegralFunction equation(
+            setup.residuals, requests[side].second, requests[side].first, setup.sumOfResiduals,
+            setup.normalizingConstant, setup.lower, setup.upper, setup.nodes, setup.weights);
+        equation.useNodeValues(&setup.values);
+        const double root =
+            solveFromStart(equation, startingPoint(n, requests[side].first, requests[side].second));
+        *factors[side] = signs[side] * root;
+    }
+}
+
+void SExtremeValueModelTI::calcKFactor(double& k, bool upper) const {
+    if (upper) {
+        calcLowerKFactor(1.0 - alpha, 1.0 - proportion, k, 1);
+    } else {
+        calcLowerKFactor(alpha, proportion, k, -1);
+    }
+}
+
+// --- LExtremeValueModelTI ---------------------------------------------------------------------
+
+LExtremeValueModelTI::LExtremeValueModelTI(const double* observations, uint32_t count,
+                                           double alphaLevel, double proportionToCover,
+                                           kel_ConfidenceType type)
+    : SExtremeValueModelTI(observations, count, alphaLevel, proportionToCover, type) {}
+
+void LExtremeValueModelTI::transformData() {
+    for (double& value : data) value = -value;
+}
+
+int32_t LExtremeValueModelTI::estimateTIBasedParameters() {
+    transformData();
+    return SExtremeValueModelTI::estimateTIBasedParameters();
+}
+
+void LExtremeValueModelTI::calcKFactor(double& k, bool upper) const {
+    // The lower limit of the data is the negated upper limit of the negated sample.
+    if (upper) {
+        calcLowerKFactor(alpha, proportion, k, -1);
+    } else {
+        calcLowerKFactor(1.0 - alpha, 1.0 - proportion, k, 1);
+    }
+}
+
+void LExtremeValueModelTI::calcToleranceInterval() {
+    const double mu = location;
+    const double sigma = scale;
+    if (confidenceType == kel_TwoSided) std::swap(lowerKFactor, upperKFactor);
+    if (confidenceType <= 0) {
+        lowerLimit = std::isnan(lowerKFactor) ? kNaN : -(lowerKFactor * sigma + mu);
+        if (confidenceType < 0) {
+            upperLimit = lowerLimit;
+            return;
+        }
+    }
+    if (confidenceType >= 0) {
+        upperLimit = std::isnan(upperKFactor) ? kNaN : -(mu - upperKFactor * sigma);
+        if (confidenceType > 0) lowerLimit = upperLimit;
+    }
+}
+
+void LExtremeValueModelTI::backTransFormEstimates() {
+    if (!std::isnan(location)) location = -location;
+}
+
+// --- WeibullModelTI ---------------------------------------------------------------------------
+
+WeibullModelTI::WeibullModelTI(const double* observations, uint32_t count, double alphaLevel,
+                               double proportionToCover, kel_ConfidenceType type)
+    : SExtremeValueModelTI(observations, count, alphaLevel, proportionToCover, type) {
+    logTransformed = true;
+}
+
+int32_t WeibullModelTI::estimateTIBasedParameters() {
+    transformData();
+    return SExtremeValueModelTI::estimateTIBasedParameters();
+}
+
+void WeibullModelTI::backTransFormEstimates() {
+    if (!std::isnan(location)) location = std::exp(location);
+    if (std::isnan(location)) {
+        scale = kNaN;
+    } else if (equalWithinFuzz(scale, 0.0, 0.0)) {
+        scale = kNaN;
+    } else {
+        scale = 1.0 / scale;
+    }
+}
+
+}  // namespace kelstat
