@@ -113,7 +113,7 @@ void BM_FitGamma(benchmark::State& state) {
             qdr_FitGamma(data.data(), fit, static_cast<unsigned>(data.size())));
     }
 }
-BENCHMARK(BM_FitGamma)->Arg(20)->Arg(1000000)->Unit(benchmark::kMillisecond);
+BENCHMARK(BM_FitGamma)->Arg(20)->Arg(1000000)->Unit(benchmark::kMicrosecond);
 
 void BM_FitGumbel(benchmark::State& state) {
     const std::vector<double> data = extremeValueSample(static_cast<std::size_t>(state.range(0)));

@@ -262,7 +262,7 @@ int fitExtremeValue(const double* data, unsigned int count, double* fit) {
     if (!(scale > 0.0)) {
         scale = 0.5 * high;
     }
-    // Each pass re-standardises on the fly into this functor.
+    // One pass over the data: the weighted moments of the offsets at scale b.
     auto moments = [&](double b) {
         const double inverseScale = 1.0 / b;
         BlockSum weightSum;
