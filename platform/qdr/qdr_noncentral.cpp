@@ -304,7 +304,7 @@ double noncentralTQuantile(double p, double df, double ncp) {
     // iterate away; once bracketed, steps leaving the bracket are replaced by bisection.
     double low = -kInfinity;
     double high = kInfinity;
-    double maxStep = std::max(1.0, 0.1 * std::fabs(t));
+    double maxStep = std::max(1.0, std::fabs(t));
     for (int iteration = 0; iteration < kTMaxIterations; ++iteration) {
         if (residual == 0.0) {
             return t;
