@@ -21,8 +21,9 @@ constexpr double kIntegrationLower = 0.0;
 constexpr double kIntegrationUpper = 8.3;
 
 // G tends to alpha > 0 as t -> 0 and to alpha - 1 < 0 as t grows, so the widening loops end
-// after a few dozen steps for any sensible request. Valid factors have been seen to need well
-// over a hundred steps from a poor start; past this many the request is hopeless: NaN.
+// after a few steps for any sensible request. The cap leaves room for a few hundred steps from
+// a poor start (past the tenth step the downward loop only creeps); beyond it the request is
+// hopeless (a proportion or confidence of 0 or 1): NaN.
 constexpr int kMaxBracketSteps = 1000;
 
 // Smallest t the downward widening tries; from the eleventh step on it creeps below this.
