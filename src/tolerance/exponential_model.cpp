@@ -1,5 +1,6 @@
 #include "tolerance/exponential_model.h"
 
+#include <algorithm>
 #include <cmath>
 #include <limits>
 
@@ -193,31 +194,17 @@ bool ExponentialTSKFactorHelper::solvesEquations(const std::vector<double>& thet
     bool inDomain = true;
     mG(x1, v, &inDomain);
     if (inDomain) mG(x2, v, &inDomain);
-    if (!inDomain || !(v > 0.0)) return false;
-    const double residuals[] = {
-        mH(x1, x2),
-        (std::pow(v, x1) - std::pow(1.0 - v, x1)) - mProportion,
-        (std::pow(v, x2) - std::pow(1.0 - v, x2)) - mProportion,
-    };
-    for (double residual : residuals) {
-        if (!(std::fabs(residual) <= kSolutionTolerance)) return false;
-    }
-    return true;
+    if (!inDomain || !(v > 0.0) || !std::isfinite(x1) || !std::isfinite(x2)) return false;
+    return largestResidual(theta) <= kSolutionTolerance;
 }
 
 namespace {
 
-// Residuals of the three equations at theta; g without its domain gate.
-struct Residuals {
-    double values[3];
-    double largest() const {
-        double worst = 0.0;
-        for (double value : values) {
-            if (!(std::fabs(value) <= worst)) worst = std::fabs(value);  // NaN sticks
-        }
-        return worst;
-    }
-};
+// Newton on the equations converges quadratically from where the maximiser leaves off; the caps
+// bound a start far from any solution.
+constexpr int kMaxRefinementSteps = 100;
+// A step is halved at most this often before the refinement settles at the current point.
+constexpr int kMaxRefinementHalvings = 60;
 
 double determinant3(const double m[3][3]) {
     return m[0][0] * (m[1][1] * m[2][2] - m[1][2] * m[2][1]) -
@@ -225,61 +212,150 @@ double determinant3(const double m[3][3]) {
            m[0][2] * (m[1][0] * m[2][1] - m[1][1] * m[2][0]);
 }
 
-// Newton on the equations converges quadratically from where the maximiser leaves off; a few
-// dozen steps are plenty, and the cap bounds a start far from any solution.
-constexpr int kMaxRefinementSteps = 100;
-// A step is halved at most this often before the refinement gives up at the current point.
-constexpr int kMaxRefinementHalvings = 60;
+// Solves m delta = rhs by Cramer's rule; false when m is singular or not finite.
+bool solve3(const double m[3][3], const double rhs[3], double delta[3]) {
+    const double det = determinant3(m);
+    if (!std::isfinite(det) || det == 0.0) return false;
+    for (int column = 0; column < 3; ++column) {
+        double replaced[3][3];
+        for (int row = 0; row < 3; ++row) {
+            for (int col = 0; col < 3; ++col) {
+                replaced[row][col] = col == column ? rhs[row] : m[row][col];
+            }
+        }
+        delta[column] = determinant3(replaced) / det;
+    }
+    return true;
+}
+
+double largestMagnitude(const double values[3]) {
+    double largest = 0.0;
+    for (int i = 0; i < 3; ++i) {
+        if (!(std::fabs(values[i]) <= largest)) largest = std::fabs(values[i]);  // NaN sticks
+    }
+    return largest;
+}
+
+// g(x) = v^x - u^x - p with u = 1 - v = e^s, and its derivatives in x and s. Near v = 1 a double
+// v keeps few digits of u; s keeps them all.
+struct ContentTerms {
+    double value;
+    double dx;
+    double ds;
+};
+
+ContentTerms contentInLogComplement(double x, double s, double p) {
+    const double u = std::exp(s);
+    const double logV = std::log1p(-u);
+    const double vPower = std::exp(x * logV);
+    const double uPower = std::exp(x * s);
+    return {(vPower - uPower) - p, logV * vPower - s * uPower,
+            -x * u * std::exp((x - 1.0) * logV) - x * uPower};
+}
 
 }  // namespace
 
+double ExponentialTSKFactorHelper::largestResidual(const std::vector<double>& theta) const {
+    const double x1 = theta[0];
+    const double x2 = theta[1];
+    const double v = theta[2];
+    const double residuals[3] = {
+        mH(x1, x2),
+        (std::pow(v, x1) - std::pow(1.0 - v, x1)) - mProportion,
+        (std::pow(v, x2) - std::pow(1.0 - v, x2)) - mProportion,
+    };
+    return largestMagnitude(residuals);
+}
+
 bool ExponentialTSKFactorHelper::refineSolution(std::vector<double>& theta) const {
     if (theta.size() != static_cast<std::size_t>(kParameterCount)) return false;
-    const auto residualsAt = [this](const std::vector<double>& point) {
-        const double v = point[2];
-        return Residuals{{mH(point[0], point[1]),
-                          (std::pow(v, point[0]) - std::pow(1.0 - v, point[0])) - mProportion,
-                          (std::pow(v, point[1]) - std::pow(1.0 - v, point[1])) - mProportion}};
+    if (!(theta[2] > 0.0 && theta[2] < 1.0)) return false;
+
+    // First the solution itself, in (x1, x2, ln(1 - v)).
+    double point[3] = {theta[0], theta[1], std::log(1.0 - theta[2])};
+    const auto residualsAt = [this](const double at[3], double out[3]) {
+        out[0] = mH(at[0], at[1]);
+        out[1] = contentInLogComplement(at[0], at[2], mProportion).value;
+        out[2] = contentInLogComplement(at[1], at[2], mProportion).value;
     };
-    Residuals residuals = residualsAt(theta);
-    for (int step = 0; step < kMaxRefinementSteps && residuals.largest() > 0.0; ++step) {
+    double residuals[3];
+    residualsAt(point, residuals);
+    for (int step = 0; step < kMaxRefinementSteps && largestMagnitude(residuals) > 0.0; ++step) {
         std::vector<double> dH;
-        std::vector<double> dG1;
-        std::vector<double> dG2;
-        mHDerivatives(theta[0], theta[1], dH);
-        mGDerivatives(theta[0], theta[2], dG1);
-        mGDerivatives(theta[1], theta[2], dG2);
+        mHDerivatives(point[0], point[1], dH);
+        const ContentTerms g1 = contentInLogComplement(point[0], point[2], mProportion);
+        const ContentTerms g2 = contentInLogComplement(point[1], point[2], mProportion);
         const double jacobian[3][3] = {
-            {dH[0], dH[1], 0.0}, {dG1[0], 0.0, dG1[1]}, {0.0, dG2[0], dG2[1]}};
-        const double det = determinant3(jacobian);
-        if (!std::isfinite(det) || det == 0.0) break;
-        // Cramer's rule for J delta = -r, one column replaced at a time.
+            {dH[0], dH[1], 0.0}, {g1.dx, 0.0, g1.ds}, {0.0, g2.dx, g2.ds}};
+        const double rhs[3] = {-residuals[0], -residuals[1], -residuals[2]};
         double delta[3];
-        for (int column = 0; column < 3; ++column) {
-            double replaced[3][3];
-            for (int row = 0; row < 3; ++row) {
-                for (int col = 0; col < 3; ++col) {
-                    replaced[row][col] =
-                        col == column ? -residuals.values[row] : jacobian[row][col];
-                }
-            }
-            delta[column] = determinant3(replaced) / det;
-        }
+        if (!solve3(jacobian, rhs, delta)) break;
         bool improved = false;
-        std::vector<double> trial(theta);
         for (int halving = 0; halving <= kMaxRefinementHalvings && !improved; ++halving) {
-            for (int i = 0; i < 3; ++i) trial[i] = theta[i] + delta[i];
-            const Residuals trialResiduals = residualsAt(trial);
-            if (trialResiduals.largest() < residuals.largest()) {
-                theta = trial;
-                residuals = trialResiduals;
+            const double trial[3] = {point[0] + delta[0], point[1] + delta[1], point[2] + delta[2]};
+            double trialResiduals[3];
+            residualsAt(trial, trialResiduals);
+            if (largestMagnitude(trialResiduals) < largestMagnitude(residuals)) {
+                std::copy(trial, trial + 3, point);
+                std::copy(trialResiduals, trialResiduals + 3, residuals);
                 improved = true;
             }
             for (double& component : delta) component *= 0.5;
         }
         if (!improved) break;
     }
+
+    // Then the reported triple: v rounds to a double whose spacing near 1 can exceed the
+    // tolerance's worth of u, so the ratio bounds are refitted to each of the doubles around it
+    // and the best triple is kept.
+    const double nearest = 1.0 - std::exp(point[2]);
+    const double candidates[3] = {std::nextafter(nearest, 0.0), nearest,
+                                  std::nextafter(nearest, 2.0)};
+    std::vector<double> best;
+    double bestResidual = kNaN;
+    for (double v : candidates) {
+        if (!(v > 0.0 && v < 1.0) || equalWithinFuzz(v, 1.0, 0.0)) continue;
+        std::vector<double> candidate = {point[0], point[1], v};
+        fitRatioBounds(candidate);
+        const double residual = largestResidual(candidate);
+        if (best.empty() || residual < bestResidual) {
+            best = candidate;
+            bestResidual = residual;
+        }
+    }
+    if (best.empty()) return false;
+    theta = best;
     return solvesEquations(theta);
+}
+
+void ExponentialTSKFactorHelper::fitRatioBounds(std::vector<double>& theta) const {
+    const double v = theta[2];
+    std::vector<double> dG;
+    // x2 alone sets g2: Newton on it.
+    for (int step = 0; step < kMaxRefinementSteps; ++step) {
+        const double x2 = theta[1];
+        const double g2 = (std::pow(v, x2) - std::pow(1.0 - v, x2)) - mProportion;
+        mGDerivatives(x2, v, dG);
+        const double next = x2 - g2 / dG[0];
+        if (!std::isfinite(next) || next == x2) break;
+        theta[1] = next;
+    }
+    // x1 enters both h and g1: least squares in x1 (Gauss-Newton), so that neither residual
+    // carries the whole of what v's rounding leaves.
+    std::vector<double> dH;
+    for (int step = 0; step < kMaxRefinementSteps; ++step) {
+        const double x1 = theta[0];
+        const double h = mH(x1, theta[1]);
+        const double g1 = (std::pow(v, x1) - std::pow(1.0 - v, x1)) - mProportion;
+        mHDerivatives(x1, theta[1], dH);
+        mGDerivatives(x1, v, dG);
+        const double next = x1 - (dH[0] * h + dG[0] * g1) / (dH[0] * dH[0] + dG[0] * dG[0]);
+        if (!std::isfinite(next) || next == x1) break;
+        const double nextH = mH(next, theta[1]);
+        const double nextG1 = (std::pow(v, next) - std::pow(1.0 - v, next)) - mProportion;
+        if (!(nextH * nextH + nextG1 * nextG1 < h * h + g1 * g1)) break;
+        theta[0] = next;
+    }
 }
 
 // --- ExponentialModelTI -----------------------------------------------------------------------

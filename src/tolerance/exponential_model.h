@@ -53,18 +53,25 @@ class ExponentialTSKFactorHelper : public FunctionFirstNegSecondDerivative {
     void mGSecDerivatives(double x, double v, std::vector<double>& d) const;
 
     // Whether theta = (x1, x2, v) solves the three equations inside g's domain: 0 < v, v below 1
-    // and not within the fuzz of it, x1 and x2 not negative, and |h|, |g1|, |g2| each within
-    // kSolutionTolerance. A maximisation that stopped short of the maximum fails this.
+    // and not within the fuzz of it, x1 and x2 finite and not negative, and |h|, |g1|, |g2| each
+    // within kSolutionTolerance. A maximisation that stopped short of the maximum fails this.
     bool solvesEquations(const std::vector<double>& theta) const;
 
     static constexpr double kSolutionTolerance = 1e-8;
 
-    // Newton steps on the three equations themselves (not on the objective), halved while they
-    // do not reduce the largest residual, from theta until the residuals stop shrinking. For a
-    // maximisation that stopped where the objective is flat to its tolerances but the equations
-    // are not yet met. True when the end point passes solvesEquations; theta holds the end point
-    // either way.
+    // For a maximisation that stopped where the objective is flat to its tolerances but the
+    // equations are not yet met. Newton steps on the three equations themselves, in
+    // (x1, x2, ln(1 - v)) so that v near 1 keeps its digits, halved while they do not reduce the
+    // largest residual; then, for each double next to the solution's v, the ratio bounds refitted
+    // by fitRatioBounds, keeping the triple with the smallest residuals. True when that triple
+    // passes solvesEquations; theta holds it either way (unchanged when v is not in (0, 1)).
     bool refineSolution(std::vector<double>& theta) const;
+
+    // With v held: x2 from g2 = 0, then x1 by least squares on h and g1.
+    void fitRatioBounds(std::vector<double>& theta) const;
+
+    // The largest of |h|, |g1|, |g2| at theta, g without its domain gate; NaN if any is NaN.
+    double largestResidual(const std::vector<double>& theta) const;
 
   private:
     double mSampleSize;
