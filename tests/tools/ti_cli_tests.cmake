@@ -13,8 +13,8 @@ kelstat_cli_test(ti_help 0 - - - ti --help)
 kelstat_cli_test(ti_gamma_all_equal 1 - "all observations are equal" ${ti_expected}/tolerance_cli_tied.txt
   ti --model gamma)
 kelstat_cli_test(ti_unknown_model 2 - "unknown model 'beta'" - ti --model beta ${ti_sample})
-kelstat_cli_test(ti_model_not_available 2 - "not available in this version" -
-  ti --model weibull ${ti_sample})
+kelstat_cli_test(ti_weibull_upper 0 - - - ti --model weibull --sided upper ${ti_sample})
+kelstat_cli_test(ti_exponential_json 0 - - - ti --model exponential --json ${ti_sample})
 kelstat_cli_test(ti_confidence_too_high 2 - "confidence '95' is not a fraction" -
   ti --confidence 95 ${ti_sample})
 kelstat_cli_test(ti_confidence_one 2 - "confidence '1' is not a fraction" -

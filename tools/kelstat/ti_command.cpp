@@ -32,12 +32,12 @@ constexpr ModelEntry kModels[] = {
     {"normal", "normal", KEL_DIST_NORMAL, true},
     {"lognormal", "lognormal", KEL_DIST_LOGNORMAL, true},
     {"gamma", "gamma", KEL_DIST_GAMMA, true},
-    {"weibull", "Weibull", KEL_DIST_WEIBULL, false},
-    {"sev", "smallest extreme value", KEL_DIST_SMALLEST_EXTREME_VALUE, false},
-    {"lev", "largest extreme value", KEL_DIST_LARGEST_EXTREME_VALUE, false},
-    {"exponential", "exponential", KEL_DIST_EXPONENTIAL, false},
-    {"loglogistic", "log-logistic", KEL_DIST_LOGLOGISTIC, false},
-    {"logistic", "logistic", KEL_DIST_LOGISTIC, false},
+    {"weibull", "Weibull", KEL_DIST_WEIBULL, true},
+    {"sev", "smallest extreme value", KEL_DIST_SMALLEST_EXTREME_VALUE, true},
+    {"lev", "largest extreme value", KEL_DIST_LARGEST_EXTREME_VALUE, true},
+    {"exponential", "exponential", KEL_DIST_EXPONENTIAL, true},
+    {"loglogistic", "log-logistic", KEL_DIST_LOGLOGISTIC, true},
+    {"logistic", "logistic", KEL_DIST_LOGISTIC, true},
     {"nonparametric", "nonparametric", kNonParametric, true},
 };
 
@@ -85,20 +85,26 @@ void printTiUsage(std::FILE* out) {
         "separated by white space, commas or new lines.\n"
         "\n"
         "options:\n"
-        "  --model M       the method: %s;\n"
-        "                  all shows every method side by side; default normal\n"
+        "  --model M       the method, from the list below; default normal\n"
         "  --confidence C  confidence level, a fraction in (0, 1); default 0.95\n"
         "  --proportion P  proportion of the population to cover, in (0, 1); default 0.90\n"
         "  --sided S       two (interval, the default), lower or upper (one bound)\n"
         "  --json          machine-readable output (NaN is written as null)\n"
         "  --help          show this help\n"
         "\n"
-        "The nonparametric method uses order statistics of the sorted sample and reports\n"
-        "the confidence they actually achieve; it needs enough observations for the\n"
-        "request (59 for a 95 %%/95 %% one-sided bound, 93 for an interval).\n"
-        "Exit status: 0 success, 1 the model's fit reported a problem (results are\n"
-        "still shown), 2 bad arguments or input.\n",
-        availableModelNames().c_str());
+        "methods:\n");
+    for (const ModelEntry& model : kModels) {
+        if (model.available) std::fprintf(out, "  %-15s %s\n", model.name, model.title);
+    }
+    std::fprintf(out,
+                 "  %-15s every method side by side\n"
+                 "\n"
+                 "The nonparametric method uses order statistics of the sorted sample and reports\n"
+                 "the confidence they actually achieve; it needs enough observations for the\n"
+                 "request (59 for a 95 %%/95 %% one-sided bound, 93 for an interval).\n"
+                 "Exit status: 0 success, 1 the model's fit reported a problem (results are\n"
+                 "still shown), 2 bad arguments or input.\n",
+                 "all");
 }
 
 const char* codeMeaning(int32_t code) {
@@ -264,7 +270,7 @@ std::string jsonNumber(double value) {
 // K-factors only where the method has them.
 struct Row {
     const char* label;
-    const char* key;
+    const char* shortLabel;  // column heading of the side-by-side table
     double TiResult::*field;
 };
 
@@ -273,20 +279,19 @@ std::vector<Row> rowsFor(kel_ConfidenceType sided, bool anyParametric, bool anyN
     if (anyParametric) {
         rows.push_back({"location", "location", &TiResult::location});
         rows.push_back({"scale", "scale", &TiResult::scale});
-        if (sided <= 0) rows.push_back({"lower K-factor", "lowerKFactor", &TiResult::lowerKFactor});
-        if (sided >= 0) rows.push_back({"upper K-factor", "upperKFactor", &TiResult::upperKFactor});
+        if (sided <= 0) rows.push_back({"lower K-factor", "lower K", &TiResult::lowerKFactor});
+        if (sided >= 0) rows.push_back({"upper K-factor", "upper K", &TiResult::upperKFactor});
     }
     if (sided == kel_TwoSided) {
-        rows.push_back({"lower limit", "lowerLimit", &TiResult::lowerLimit});
-        rows.push_back({"upper limit", "upperLimit", &TiResult::upperLimit});
+        rows.push_back({"lower limit", "lower limit", &TiResult::lowerLimit});
+        rows.push_back({"upper limit", "upper limit", &TiResult::upperLimit});
     } else if (sided == kel_LowerBound) {
-        rows.push_back({"lower bound", "lowerLimit", &TiResult::lowerLimit});
+        rows.push_back({"lower bound", "lower bound", &TiResult::lowerLimit});
     } else {
-        rows.push_back({"upper bound", "upperLimit", &TiResult::upperLimit});
+        rows.push_back({"upper bound", "upper bound", &TiResult::upperLimit});
     }
     if (anyNonParametric) {
-        rows.push_back(
-            {"achieved confidence %", "achievedConfidence", &TiResult::achievedConfidence});
+        rows.push_back({"achieved confidence %", "achieved %", &TiResult::achievedConfidence});
     }
     return rows;
 }
@@ -326,22 +331,19 @@ void printText(const std::vector<TiResult>& results, const TiOptions& options, s
         noteShortfall(results, options, count);
         return;
     }
-    constexpr int kColumnWidth = 14;
-    std::printf("%-22s", "");
-    for (const TiResult& result : results) std::printf(" %*s", kColumnWidth, result.model->name);
-    std::printf("\n");
-    for (const Row& row : rows) {
-        std::printf("%-22s", row.label);
-        for (const TiResult& result : results) {
-            std::printf(" %*s", kColumnWidth, formatNumber(result.*(row.field), 7).c_str());
-        }
-        std::printf("\n");
-    }
-    std::printf("%-22s", "result code");
+    // One row per method, so that the table stays narrow however many methods there are.
+    constexpr int kNameWidth = 14;
+    constexpr int kColumnWidth = 12;
+    std::printf("%-*s", kNameWidth, "method");
+    for (const Row& row : rows) std::printf(" %*s", kColumnWidth, row.shortLabel);
+    std::printf("  code\n");
     for (const TiResult& result : results) {
-        std::printf(" %*d", kColumnWidth, static_cast<int>(result.code));
+        std::printf("%-*s", kNameWidth, result.model->name);
+        for (const Row& row : rows) {
+            std::printf(" %*s", kColumnWidth, formatNumber(result.*(row.field), 6).c_str());
+        }
+        std::printf("  %4d\n", static_cast<int>(result.code));
     }
-    std::printf("\n");
     for (const TiResult& result : results) {
         if (result.code != 0) {
             std::printf("%s: code %d, %s\n", result.model->name, static_cast<int>(result.code),
