@@ -137,6 +137,20 @@ TEST(NonParametricTest, EdgeRequests) {
     }
 }
 
+TEST(NonParametricTest, SampleSizesBeyondThirtyTwoBitIndicesAreRefused) {
+    NonParametricTI largest(2147000000u, 0.05, 0.9, kel_TwoSided);
+    largest.executeToleranceInterval(kel_TwoSided, 0.95, 0.9);
+    EXPECT_GT(largest.lowerLimit, 0.0);
+    EXPECT_LT(largest.upperLimit, 2147000000.0);
+    EXPECT_NEAR(largest.achievedConfidence, 95.0, 0.01);
+    for (uint32_t n : {2147000001u, 4294967295u}) {
+        NonParametricTI model(n, 0.05, 0.9, kel_TwoSided);
+        model.executeToleranceInterval(kel_TwoSided, 0.95, 0.9);
+        EXPECT_TRUE(isQuietNaN(model.lowerLimit)) << n;
+        EXPECT_TRUE(isQuietNaN(model.achievedConfidence)) << n;
+    }
+}
+
 TEST(BetaCdfFuncForTITest, FallsFromCToCMinusOne) {
     BetaCdfFuncForTI f(10.0, 0.1, 0.95);
     EXPECT_EQ(f(-1.0), 0.95);
