@@ -104,8 +104,26 @@ Result scaled(double factor, const A& a) {
     return r;
 }
 
+// Adds to r(i, colTile + c), c < width, the partial dot products of row i of a with those columns
+// of b over the inner indexes [innerBegin, innerEnd). FixedWidth is the width when it is known at
+// compile time (a full tile: the partial sums then live in registers), else 0.
+template <int FixedWidth>
+void addTileRow(const DenseMatrix& a, const DenseMatrix& b, int i, int colTile, int innerBegin,
+                int innerEnd, DenseMatrix& r) {
+    const int width = FixedWidth > 0 ? FixedWidth : std::min(kTile, b.colCount() - colTile);
+    double partial[kTile] = {};
+    for (int k = innerBegin; k < innerEnd; ++k) {
+        const double left = a(i, k);
+        const double* rightRow = &b(k, colTile);
+        for (int c = 0; c < width; ++c) partial[c] += left * rightRow[c];
+    }
+    double* resultRow = &r(i, colTile);
+    for (int c = 0; c < width; ++c) resultRow[c] += partial[c];
+}
+
 // Tiles of kTile rows x kTile columns x kTile inner indexes; every result element of a tile adds
-// the partial dot product over the inner tile. Edge tiles are cut to the matrix.
+// the partial dot product over the inner tile. Edge tiles are cut to the matrix. The partial sums
+// of one result row run side by side, so both operands are read along their rows.
 DenseMatrix tiledProduct(const DenseMatrix& a, const DenseMatrix& b) {
     checkInnerOrders(a, b);
     const int rows = a.rowCount();
@@ -115,14 +133,14 @@ DenseMatrix tiledProduct(const DenseMatrix& a, const DenseMatrix& b) {
     for (int rowTile = 0; rowTile < rows; rowTile += kTile) {
         const int rowEnd = std::min(rowTile + kTile, rows);
         for (int colTile = 0; colTile < cols; colTile += kTile) {
-            const int colEnd = std::min(colTile + kTile, cols);
+            const int width = std::min(kTile, cols - colTile);
             for (int innerTile = 0; innerTile < inner; innerTile += kTile) {
                 const int innerEnd = std::min(innerTile + kTile, inner);
                 for (int i = rowTile; i < rowEnd; ++i) {
-                    for (int j = colTile; j < colEnd; ++j) {
-                        double partial = 0.0;
-                        for (int k = innerTile; k < innerEnd; ++k) partial += a(i, k) * b(k, j);
-                        r(i, j) += partial;
+                    if (width == kTile) {
+                        addTileRow<kTile>(a, b, i, colTile, innerTile, innerEnd, r);
+                    } else {
+                        addTileRow<0>(a, b, i, colTile, innerTile, innerEnd, r);
                     }
                 }
             }
