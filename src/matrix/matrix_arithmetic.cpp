@@ -210,32 +210,102 @@ double residualQuadraticForm(const Square& a, const DenseMatrix& b, const Vector
 
 // ---- Sums and differences ------------------------------------------------------------------
 
-#define KELSTAT_ELEMENTWISE_PAIR(Result, A, B, name)                  \
-    Result operator+(const A& a, const B& b) {                        \
-        return elementwise<Result>(a, b, name, std::plus<double>());  \
-    }                                                                 \
-    Result operator-(const A& a, const B& b) {                        \
-        return elementwise<Result>(a, b, name, std::minus<double>()); \
-    }
-
-KELSTAT_ELEMENTWISE_PAIR(DenseMatrix, DenseMatrix, DenseMatrix, kAdditionName)
-KELSTAT_ELEMENTWISE_PAIR(DenseMatrix, DenseMatrix, SymmetricMatrix, kAdditionName)
-KELSTAT_ELEMENTWISE_PAIR(DenseMatrix, DenseMatrix, UpperMatrix, kAdditionName)
-KELSTAT_ELEMENTWISE_PAIR(DenseMatrix, DenseMatrix, DiagonalMatrix, kAdditionName)
-KELSTAT_ELEMENTWISE_PAIR(DenseMatrix, SymmetricMatrix, DenseMatrix, kAdditionName)
-KELSTAT_ELEMENTWISE_PAIR(SymmetricMatrix, SymmetricMatrix, SymmetricMatrix, kAdditionName)
-KELSTAT_ELEMENTWISE_PAIR(DenseMatrix, SymmetricMatrix, UpperMatrix, kAdditionName)
-KELSTAT_ELEMENTWISE_PAIR(SymmetricMatrix, SymmetricMatrix, DiagonalMatrix, kAdditionName)
-KELSTAT_ELEMENTWISE_PAIR(DenseMatrix, UpperMatrix, DenseMatrix, kAdditionName)
-KELSTAT_ELEMENTWISE_PAIR(DenseMatrix, UpperMatrix, SymmetricMatrix, kAdditionName)
-KELSTAT_ELEMENTWISE_PAIR(UpperMatrix, UpperMatrix, UpperMatrix, kUpperElementwiseName)
-KELSTAT_ELEMENTWISE_PAIR(UpperMatrix, UpperMatrix, DiagonalMatrix, kUpperElementwiseName)
-KELSTAT_ELEMENTWISE_PAIR(DenseMatrix, DiagonalMatrix, DenseMatrix, kAdditionName)
-KELSTAT_ELEMENTWISE_PAIR(SymmetricMatrix, DiagonalMatrix, SymmetricMatrix, kAdditionName)
-KELSTAT_ELEMENTWISE_PAIR(UpperMatrix, DiagonalMatrix, UpperMatrix, kUpperElementwiseName)
-KELSTAT_ELEMENTWISE_PAIR(DiagonalMatrix, DiagonalMatrix, DiagonalMatrix, kDiagonalElementwiseName)
-
-#undef KELSTAT_ELEMENTWISE_PAIR
+DenseMatrix operator+(const DenseMatrix& a, const DenseMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::plus<double>());
+}
+DenseMatrix operator+(const DenseMatrix& a, const SymmetricMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::plus<double>());
+}
+DenseMatrix operator+(const DenseMatrix& a, const UpperMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::plus<double>());
+}
+DenseMatrix operator+(const DenseMatrix& a, const DiagonalMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::plus<double>());
+}
+DenseMatrix operator+(const SymmetricMatrix& a, const DenseMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::plus<double>());
+}
+SymmetricMatrix operator+(const SymmetricMatrix& a, const SymmetricMatrix& b) {
+    return elementwise<SymmetricMatrix>(a, b, kAdditionName, std::plus<double>());
+}
+DenseMatrix operator+(const SymmetricMatrix& a, const UpperMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::plus<double>());
+}
+SymmetricMatrix operator+(const SymmetricMatrix& a, const DiagonalMatrix& b) {
+    return elementwise<SymmetricMatrix>(a, b, kAdditionName, std::plus<double>());
+}
+DenseMatrix operator+(const UpperMatrix& a, const DenseMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::plus<double>());
+}
+DenseMatrix operator+(const UpperMatrix& a, const SymmetricMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::plus<double>());
+}
+UpperMatrix operator+(const UpperMatrix& a, const UpperMatrix& b) {
+    return elementwise<UpperMatrix>(a, b, kUpperElementwiseName, std::plus<double>());
+}
+UpperMatrix operator+(const UpperMatrix& a, const DiagonalMatrix& b) {
+    return elementwise<UpperMatrix>(a, b, kUpperElementwiseName, std::plus<double>());
+}
+DenseMatrix operator+(const DiagonalMatrix& a, const DenseMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::plus<double>());
+}
+SymmetricMatrix operator+(const DiagonalMatrix& a, const SymmetricMatrix& b) {
+    return elementwise<SymmetricMatrix>(a, b, kAdditionName, std::plus<double>());
+}
+UpperMatrix operator+(const DiagonalMatrix& a, const UpperMatrix& b) {
+    return elementwise<UpperMatrix>(a, b, kUpperElementwiseName, std::plus<double>());
+}
+DiagonalMatrix operator+(const DiagonalMatrix& a, const DiagonalMatrix& b) {
+    return elementwise<DiagonalMatrix>(a, b, kDiagonalElementwiseName, std::plus<double>());
+}
+DenseMatrix operator-(const DenseMatrix& a, const DenseMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::minus<double>());
+}
+DenseMatrix operator-(const DenseMatrix& a, const SymmetricMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::minus<double>());
+}
+DenseMatrix operator-(const DenseMatrix& a, const UpperMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::minus<double>());
+}
+DenseMatrix operator-(const DenseMatrix& a, const DiagonalMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::minus<double>());
+}
+DenseMatrix operator-(const SymmetricMatrix& a, const DenseMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::minus<double>());
+}
+SymmetricMatrix operator-(const SymmetricMatrix& a, const SymmetricMatrix& b) {
+    return elementwise<SymmetricMatrix>(a, b, kAdditionName, std::minus<double>());
+}
+DenseMatrix operator-(const SymmetricMatrix& a, const UpperMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::minus<double>());
+}
+SymmetricMatrix operator-(const SymmetricMatrix& a, const DiagonalMatrix& b) {
+    return elementwise<SymmetricMatrix>(a, b, kAdditionName, std::minus<double>());
+}
+DenseMatrix operator-(const UpperMatrix& a, const DenseMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::minus<double>());
+}
+DenseMatrix operator-(const UpperMatrix& a, const SymmetricMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::minus<double>());
+}
+UpperMatrix operator-(const UpperMatrix& a, const UpperMatrix& b) {
+    return elementwise<UpperMatrix>(a, b, kUpperElementwiseName, std::minus<double>());
+}
+UpperMatrix operator-(const UpperMatrix& a, const DiagonalMatrix& b) {
+    return elementwise<UpperMatrix>(a, b, kUpperElementwiseName, std::minus<double>());
+}
+DenseMatrix operator-(const DiagonalMatrix& a, const DenseMatrix& b) {
+    return elementwise<DenseMatrix>(a, b, kAdditionName, std::minus<double>());
+}
+SymmetricMatrix operator-(const DiagonalMatrix& a, const SymmetricMatrix& b) {
+    return elementwise<SymmetricMatrix>(a, b, kAdditionName, std::minus<double>());
+}
+UpperMatrix operator-(const DiagonalMatrix& a, const UpperMatrix& b) {
+    return elementwise<UpperMatrix>(a, b, kUpperElementwiseName, std::minus<double>());
+}
+DiagonalMatrix operator-(const DiagonalMatrix& a, const DiagonalMatrix& b) {
+    return elementwise<DiagonalMatrix>(a, b, kDiagonalElementwiseName, std::minus<double>());
+}
 
 DenseMatrix& operator+=(DenseMatrix& a, const DiagonalMatrix& b) {
     checkSameShape(a, b, kAddDiagonalInPlaceName);
