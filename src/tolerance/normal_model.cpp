@@ -2,11 +2,13 @@
 
 #include <cmath>
 #include <cstddef>
+#include <iterator>
 #include <limits>
 
 #include "numerics/gauss_legendre.h"
 #include "numerics/root_finder.h"
 #include "qdr.h"
+#include "tolerance/gauss_legendre_36_table.h"
 
 namespace kelstat {
 
@@ -16,7 +18,6 @@ constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
 
 // The coverage integral runs over the standardized mean from 0 to 8.3 standard errors; beyond
 // that the normal density is below 1e-15 and adds nothing the root can see.
-constexpr unsigned kQuadratureOrder = 36;
 constexpr double kIntegrationLower = 0.0;
 constexpr double kIntegrationUpper = 8.3;
 
@@ -59,9 +60,13 @@ double NormalKFactorIntegrand::operator()(double x) {
 NormalKFactorIntegralFunction::NormalKFactorIntegralFunction(double sampleSize, double proportion,
                                                              double alphaLevel)
     : mSampleSize(sampleSize), mProportion(proportion), mAlpha(alphaLevel) {
-    // A failed rule leaves the lists empty; every integral is then 0 and G is alpha - 1, which
-    // the bracket search turns into NaN rather than a wrong factor.
-    findGaussianQuadratureWeights(kQuadratureOrder, mNodes, mWeights);
+    // The rule is findGaussianQuadratureWeights(36) stored bit for bit, not rebuilt per call.
+    mNodes.reserve(std::size(kNormalKFactorRule));
+    mWeights.reserve(std::size(kNormalKFactorRule));
+    for (const GaussLegendrePair& pair : kNormalKFactorRule) {
+        mNodes.push_back(pair.node);
+        mWeights.push_back(pair.weight);
+    }
 }
 
 void NormalKFactorIntegralFunction::cacheNodeValues() {

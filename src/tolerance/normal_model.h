@@ -57,7 +57,7 @@ class NormalKFactorIntegrand : public ZRXRealFunction {
 // evaluateAfresh().
 class NormalKFactorIntegralFunction : public ZRXRealFunction {
   public:
-    // Builds the 36-point rule once for all evaluations.
+    // Takes the 36-point rule once for all evaluations.
     NormalKFactorIntegralFunction(double sampleSize, double proportion, double alphaLevel);
     double operator()(double inverseK) override;
 

@@ -3,8 +3,13 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstring>
+#include <iterator>
 #include <string>
+#include <vector>
 
+#include "numerics/gauss_legendre.h"
+#include "tolerance/gauss_legendre_36_table.h"
 #include "tolerance/normal_model.h"
 #include "tolerance_test_support.h"
 
@@ -60,6 +65,17 @@ TEST(NormalKFactorTest, WorkedExamples) {
         const double k = c.twoSided ? normalTwoSidedKFactor(c.n, alpha, c.proportion)
                                     : normalOneSidedKFactor(c.n, alpha, c.proportion);
         EXPECT_NEAR(k, c.expected, c.tolerance) << c.n << " " << c.twoSided;
+    }
+}
+
+TEST(NormalKFactorTest, StoredRuleIsTheQuadratureRoutinesOutputBitForBit) {
+    std::vector<double> nodes;
+    std::vector<double> weights;
+    ASSERT_TRUE(findGaussianQuadratureWeights(36, nodes, weights));
+    ASSERT_EQ(nodes.size(), std::size(kNormalKFactorRule));
+    for (std::size_t i = 0; i < nodes.size(); ++i) {
+        EXPECT_EQ(std::memcmp(&nodes[i], &kNormalKFactorRule[i].node, sizeof(double)), 0) << i;
+        EXPECT_EQ(std::memcmp(&weights[i], &kNormalKFactorRule[i].weight, sizeof(double)), 0) << i;
     }
 }
 
