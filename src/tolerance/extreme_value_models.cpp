@@ -236,7 +236,10 @@ double fillNodeValues(EquationSetup& setup, const ResidualSummary* logarithmic, 
     values.points.assign(2 * pairs, kNaN);
     values.means.assign(2 * pairs, kNaN);
     values.densities.assign(2 * pairs, kNaN);
-    for (std::size_t pair = 0; pair < pairs; ++pair) {
+    // Outermost pairs first: where the direct form fails, it fails at the ends of the range, and
+    // the values are summed in the routine's order below whatever order filled them.
+    for (std::size_t remaining = pairs; remaining > 0; --remaining) {
+        const std::size_t pair = remaining - 1;
         const double offset = setup.nodes[pair] * half;
         const double points[2] = {mid + offset, mid - offset};
         for (std::size_t side = 0; side < 2; ++side) {
