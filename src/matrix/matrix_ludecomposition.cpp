@@ -27,9 +27,10 @@ constexpr CheckSite kInverseResult{"result", kLuFile, 397};
 // singular: dividing by it would amplify rounding beyond anything useful.
 constexpr double kSingularFuzz = 4e-12;
 
+// p equals 0 within a relative and an absolute tolerance of kSingularFuzz each; NaN is not zero.
 bool isFuzzyZero(double p) {
     const double magnitude = std::fabs(p);
-    return magnitude < kSingularFuzz || magnitude < kSingularFuzz * magnitude + kSingularFuzz;
+    return magnitude < kSingularFuzz * magnitude + kSingularFuzz;
 }
 
 std::size_t toIndex(int i) {

@@ -141,6 +141,7 @@ TEST(MatrixLU, KnownDeterminantsAndPivots) {
         {"cycle", 3, {0, 1, 0, 0, 0, 1, 1, 0, 0}, 1.0, {2, 2, 2}, 1.0},
         {"Vandermonde 1..4", 4, {1, 1, 1, 1, 1, 2, 4, 8, 1, 3, 9, 27, 1, 4, 16, 64}, 12.0, {}, 0},
         {"single small element", 1, {1e-13}, 1e-13, {0}, 1.0},
+        {"pivot just above the singularity fuzz", 2, {4.1e-12, 0, 0, 1}, 4.1e-12, {0, 1}, 1.0},
     };
     for (const Case& c : cases) {
         const Dense a = fromRows(c.order, c.rows);
@@ -192,6 +193,7 @@ TEST(MatrixLU, SingularAndNearlySingular) {
     const Case singular[] = {
         {"zero element", 1, {0.0}},
         {"small pivot beside a large one", 2, {1e-13, 0, 0, 1}},
+        {"pivot just below the singularity fuzz", 2, {3.9e-12, 0, 0, 1}},
         {"zero row", 3, {1, 2, 3, 0, 0, 0, 4, 5, 6}},
         {"rank two", 3, {1, 2, 3, 4, 5, 6, 7, 8, 9}},
         {"rows 1e-12 apart", 2, {1, 1, 1, 1 + 1e-12}},
