@@ -115,6 +115,8 @@ void addTileRow(const DenseMatrix& a, const DenseMatrix& b, int i, int colTile, 
     for (int k = innerBegin; k < innerEnd; ++k) {
         const double left = a(i, k);
         const double* rightRow = &b(k, colTile);
+        // Fully unrolled for a full tile, so that the partial sums stay in registers.
+#pragma GCC unroll 8
         for (int c = 0; c < width; ++c) partial[c] += left * rightRow[c];
     }
     double* resultRow = &r(i, colTile);
