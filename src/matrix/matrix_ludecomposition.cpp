@@ -37,8 +37,13 @@ std::size_t toIndex(int i) {
     return static_cast<std::size_t>(i);
 }
 
-void checkSquare(int rows, int cols) {
-    if (rows != cols) throw MatrixException("LU Decomp is defined for only square matrices");
+// a itself, once it is known to be square.
+template <class T>
+const matrix<T>& requireSquare(const matrix<T>& a) {
+    if (a.rowCount() != a.colCount()) {
+        throw MatrixException("LU Decomp is defined for only square matrices");
+    }
+    return a;
 }
 
 // 1 / (largest magnitude) of every row, or false when some row is zero within the fuzz.
@@ -119,7 +124,7 @@ bool decomposeInPlace(matrix<T>& a, std::vector<int>& index, double& parity) {
 
 template <class T>
 matrix<T> LUDecompSafeIterator(matrix<T> a, std::vector<int>& index, double& parity) {
-    checkSquare(a.rowCount(), a.colCount());
+    requireSquare(a);
     if (!decomposeInPlace(a, index, parity)) a.resize(0, 0);
     return a;
 }
@@ -127,8 +132,7 @@ matrix<T> LUDecompSafeIterator(matrix<T> a, std::vector<int>& index, double& par
 template matrix<double> LUDecompSafeIterator(matrix<double> a, std::vector<int>& index,
                                              double& parity);
 
-LUDecomposition::LUDecomposition(const matrix<double>& a) : factors_(a) {
-    checkSquare(a.rowCount(), a.colCount());
+LUDecomposition::LUDecomposition(const matrix<double>& a) : factors_(requireSquare(a)) {
     if (!decomposeInPlace(factors_, index_, parity_)) {
         factors_.resize(0, 0);
         singular_ = true;
