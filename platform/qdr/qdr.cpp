@@ -246,6 +246,11 @@ namespace {
 constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
 constexpr double kInfinity = std::numeric_limits<double>::infinity();
 
+// The noncentral chi-square beyond one degree of freedom is a Poisson-weighted series whose
+// length grows with the noncentrality: past these sizes it runs for minutes, so the answer is NaN.
+constexpr double kMaxSeriesNoncentrality = 1e9;
+constexpr double kMaxNoncentralQuantileDf = 1e12;
+
 // exp(-z^2 / 2) is exactly 0 in double beyond this.
 constexpr double kDensityUnderflow = 40.0;
 
@@ -324,6 +329,9 @@ double qdr_GetChiSqInvCdf(double p, double df, double ncp) {
     if (df == 1.0) {
         return kelstat::qdr_detail::chiSquareOneDfQuantile(p, ncp);
     }
+    if (ncp > kMaxSeriesNoncentrality || df > kMaxNoncentralQuantileDf) {
+        return kNaN;
+    }
     return boost::math::quantile(
         boost::math::non_central_chi_squared_distribution<double, AccuratePolicy>(df, ncp), p);
 }
@@ -342,6 +350,12 @@ double qdr_GetChiSqCdf(int tail, double x, double df, double ncp) {
     }
     if (std::isinf(x)) {
         return upperTail ? 0.0 : 1.0;
+    }
+    if (df == 1.0) {
+        return kelstat::qdr_detail::chiSquareOneDfTail(upperTail, x, ncp);
+    }
+    if (ncp > kMaxSeriesNoncentrality) {
+        return kNaN;
     }
     const boost::math::non_central_chi_squared_distribution<double, AccuratePolicy> distribution(
         df, ncp);

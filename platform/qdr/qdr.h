@@ -52,13 +52,15 @@ double qdr_GetTInvCdf(double p, double df, double ncp);
 // Chi-square quantile (lower tail): the x with P(X <= x) = p, X with df > 0 degrees of freedom and
 // noncentrality ncp >= 0 (0 is the central chi-square). p = 0 gives 0, p = 1 gives +inf; p
 // outside [0, 1] or a bad parameter gives NaN. One degree of freedom takes an exact fast route
-// through normal functions.
+// through normal functions (any ncp); other noncentral cases give NaN for ncp above 1e9 or df
+// above 1e12.
 double qdr_GetChiSqInvCdf(double p, double df, double ncp);
 
 // Chi-square distribution function at x, df > 0, ncp >= 0: tail QDR_LOWER_TAIL (0) gives
 // P(X <= x), QDR_UPPER_TAIL (1) gives P(X > x); any other tail, or a bad parameter, gives NaN.
 // x <= 0 gives 0 (lower) or 1 (upper); x = +inf gives 1 or 0. The central case is the gamma
-// distribution function below (shape df/2, scale 2) with its accuracy.
+// distribution function below (shape df/2, scale 2) with its accuracy; one degree of freedom goes
+// through normal tails; other noncentral cases give NaN for ncp above 1e9.
 double qdr_GetChiSqCdf(int tail, double x, double df, double ncp);
 
 // Central chi-square density at x with df > 0 degrees of freedom (0 for x < 0); NaN otherwise.

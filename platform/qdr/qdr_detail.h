@@ -49,6 +49,9 @@ double normalQuantile(double p);
 // lambda >= 0, through P(X <= r^2) = Phi(r - sqrt(lambda)) - Phi(-r - sqrt(lambda)).
 double chiSquareOneDfQuantile(double p, double lambda);
 
+// P(X <= x) (or P(X > x) when upperTail) for that distribution, x >= 0.
+double chiSquareOneDfTail(bool upperTail, double x, double lambda);
+
 // Noncentral t quantile for finite df > 0 and finite ncp != 0 (NaN when it cannot be computed).
 double noncentralTQuantile(double p, double df, double ncp);
 

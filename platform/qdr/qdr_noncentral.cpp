@@ -228,6 +228,12 @@ double noncentralTFallback(double p, double df, double ncp) {
 
 }  // namespace
 
+double chiSquareOneDfTail(bool upperTail, double x, double lambda) {
+    const double r = std::sqrt(x);
+    const double mu = std::sqrt(lambda);
+    return upperTail ? oneDfUpper(r, mu) : oneDfLower(r, mu);
+}
+
 double chiSquareOneDfQuantile(double p, double lambda) {
     const double mu = std::sqrt(lambda);
     // The root lies in [max(mu + z_p, z_{(1+p)/2}), mu + z_{(1+p)/2}]: P(|Z + mu| <= r) is at most

@@ -164,3 +164,31 @@ TEST(QdrNoncentralT, HugeNoncentralitiesFinishWithoutHanging) {
 }
 
 }  // namespace
+
+namespace {
+
+// Extreme but legal arguments: every answer is a number of the right sign, an overflow to
+// infinity, or NaN; never an exception (which could not cross the C interface) and never a hang.
+TEST(QdrExtremes, QuantilesFinishWithSensibleAnswers) {
+    for (double p : {1e-300, 0.5, 1.0 - 1e-16}) {
+        for (double df : {1e-3, 1.0, 7.0, 1e7}) {
+            for (double ncp : {-1e4, 30.0, 4e3}) {
+                const double t = qdr_GetTInvCdf(p, df, ncp);
+                if (p >= 0.5 && ncp > 0.0) {
+                    EXPECT_FALSE(t < 0.0) << p << " " << df << " " << ncp;
+                }
+            }
+            for (double lambda : {0.0, 2.0, 1e10}) {
+                const double x = qdr_GetChiSqInvCdf(p, df, lambda);
+                EXPECT_FALSE(x < 0.0) << p << " " << df << " " << lambda;
+                EXPECT_EQ(std::isnan(x), df != 1.0 && lambda > 1e9) << p << " " << df;
+            }
+        }
+    }
+    // One degree of freedom stays exact at any noncentrality through the normal tails.
+    EXPECT_NEAR(qdr_GetChiSqCdf(QDR_LOWER_TAIL, 1e20, 1.0, 1e20), 0.5, 1e-9);
+    EXPECT_NEAR(qdr_GetChiSqCdf(QDR_UPPER_TAIL, 4.0, 1.0, 1e-300), std::erfc(M_SQRT2), 1e-16);
+    EXPECT_TRUE(std::isnan(qdr_GetChiSqCdf(QDR_LOWER_TAIL, 1e12, 3.0, 1e12)));
+}
+
+}  // namespace
