@@ -17,7 +17,11 @@ constexpr std::int64_t kLeafBlock = 2048;
 
 void releaseArrays(kel_StemAndLeaf& container) {
     if (container.lines != nullptr) {
-        for (std::uint32_t i = 0; i < container.lineCount; ++i) delete[] container.lines[i].leaves;
+        // Most lines of a wide display are empty; skipping them keeps a release of millions of
+        // lines cheap.
+        for (std::uint32_t i = 0; i < container.lineCount; ++i) {
+            if (container.lines[i].leaves != nullptr) delete[] container.lines[i].leaves;
+        }
         delete[] container.lines;
     }
     delete[] container.lowOutliers;
@@ -242,6 +246,9 @@ std::int32_t runStemAndLeaf(const double* column, std::uint32_t n,
 
     std::int64_t position = lowIndex;
     const std::int64_t retainedEnd = highIndex + 1;
+    // The quotient of the next value to place. A line whose upper edge lies below it is empty
+    // and needs no search: a display may have millions of such lines.
+    std::int64_t nextQuotient = position < retainedEnd ? quotients[position] : 0;
     for (std::int64_t i = 0; i < lineCount; ++i) {
         upperEdge += step;
         if (negativeSide && base == 0) {
@@ -249,8 +256,10 @@ std::int32_t runStemAndLeaf(const double* column, std::uint32_t n,
         } else {
             base += step;
         }
+        const bool isEmpty = position >= retainedEnd || nextQuotient > upperEdge;
         const std::int64_t next =
-            findDepth(quotients, position, retainedEnd, upperEdge, negativeSide);
+            isEmpty ? position
+                    : findDepth(quotients, position, retainedEnd, upperEdge, negativeSide);
 
         kel_StemAndLeafLine& line = display.lines[i];
         const std::int64_t stem = base / 10;
@@ -265,6 +274,7 @@ std::int32_t runStemAndLeaf(const double* column, std::uint32_t n,
                 return KEL_STEMLEAF_INVALID_INPUT;
             }
         }
+        if (next != position && next < retainedEnd) nextQuotient = quotients[next];
         position = next;
     }
     if (!isAscendingRun(column, static_cast<std::size_t>(std::max<std::int64_t>(position, 1)), n)) {
