@@ -1,7 +1,9 @@
 #!/usr/bin/env bash
 # Installs the Debian packages the build and the tests need, when they are missing.
 set -euo pipefail
+# With the argument "fuzz": also clang and its runtime libraries, for the libFuzzer targets.
 packages=(cmake g++ make pkg-config libgtest-dev libgmock-dev libbenchmark-dev libboost-math-dev)
+[[ "${1:-}" == fuzz ]] && packages+=(clang libclang-rt-14-dev)
 missing=()
 for p in "${packages[@]}"; do
   dpkg-query -W -f='${Status}' "$p" 2>/dev/null | grep -q 'install ok installed' || missing+=("$p")
