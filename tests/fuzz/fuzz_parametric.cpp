@@ -19,6 +19,7 @@ using kelstat_fuzz::sameBits;
 
 constexpr std::size_t kLargestSample = 4000;
 constexpr int kExponentialCode = 6;
+constexpr double kSmallestOrderedProportion = 1e-3;
 
 bool isNaNOrFinite(double x) {
     return std::isnan(x) || std::isfinite(x);
@@ -69,15 +70,19 @@ void checkResult(const kel_ParametricTIData& request, const kel_ParametricTIData
     }
     if (type == kel_TwoSided) {
         // The exponential limits are multiples of the mean, so a negative mean (data outside
-        // the model's support, which it does not screen) swaps them; its factors stay ordered.
-        const bool negativeMean = result.distribution == kExponentialCode && result.location < 0.0;
-        // Levels outside (0, 1) are not screened and may give negative factors.
-        if (std::isfinite(result.lowerLimit) && std::isfinite(result.upperLimit) && !negativeMean &&
-            ordinaryLevels) {
+        // the model's support, which it does not screen) swaps them. Both exponential factors
+        // tend to ln 2 as the proportion goes to 0, where the maximiser's v (good to about
+        // 1e-8) decides their order. Levels outside (0, 1) are not screened and may give
+        // negative factors.
+        const bool exponential = result.distribution == kExponentialCode;
+        const bool mayCross =
+            !ordinaryLevels || (exponential && (result.location < 0.0 ||
+                                                result.proportion < kSmallestOrderedProportion));
+        if (std::isfinite(result.lowerLimit) && std::isfinite(result.upperLimit) && !mayCross) {
             KELSTAT_FUZZ_CHECK(result.lowerLimit <= result.upperLimit);
         }
-        if (result.distribution == kExponentialCode && ordinaryLevels &&
-            std::isfinite(result.lowerKFactor) && std::isfinite(result.upperKFactor)) {
+        if (exponential && !mayCross && std::isfinite(result.lowerKFactor) &&
+            std::isfinite(result.upperKFactor)) {
             KELSTAT_FUZZ_CHECK(result.lowerKFactor <= result.upperKFactor);
         }
     } else if (type == kel_LowerBound || type == kel_UpperBound) {
