@@ -11,6 +11,7 @@
 #include <cmath>
 #include <cstddef>
 #include <limits>
+#include <utility>
 
 #include "qdr_detail.h"
 
@@ -36,6 +37,16 @@ constexpr double kMaxFiniteSumArgument = 700.0;
 // Other shapes: arguments within this many standard deviations of the mean (where the tails
 // exceed ~1e-15 and the integrands of the tolerance factors live) take the double evaluation.
 constexpr double kFastWindowDeviations = 8.0;
+
+// Shapes from kTemmeMinShape on, with the argument within a relative distance of the shape, take
+// Temme's uniform expansion: there its error stays within the function's own conditioning (the
+// effect of rounding the argument), at a fraction of the cost of a series or a long finite sum.
+// Below kTemmeWideShape its ten terms in 1/shape fall short on the far lower side, so the window
+// is narrower there.
+constexpr double kTemmeMinShape = 20.0;
+constexpr double kTemmeWideShape = 40.0;
+constexpr double kTemmeNarrowDistance = 0.3;
+constexpr double kTemmeWideDistance = 0.4;
 
 // The series for the lower tail converges geometrically for z < shape - 1 <= 49.5; this cap is
 // far above the ~60 terms it needs and only guards the loop.
@@ -80,12 +91,13 @@ int finiteSumHalfSteps(double shape) {
 
 // Upper tail of a whole shape n: exp(-z) * sum_{k<n} z^k / k!; of a half-whole shape m + 1/2:
 // erfc(sqrt z) + exp(-z) sum_{k<m} z^{k+1/2} / Gamma(k + 3/2). Both sums in nested form, so that
-// the rounding of each level is damped by the next.
+// the rounding of each level is damped by the next; the ratios z/k do not depend on the running
+// value, so their divisions stay off its chain of dependent operations.
 double finiteSumUpperTail(double z, int halfSteps) {
     double nested = 1.0;
     if (halfSteps % 2 == 0) {
         for (int k = halfSteps / 2 - 1; k >= 1; --k) {
-            nested = 1.0 + nested * z / static_cast<double>(k);
+            nested = 1.0 + nested * (z / static_cast<double>(k));
         }
         return std::exp(-z) * nested;
     }
@@ -95,7 +107,7 @@ double finiteSumUpperTail(double z, int halfSteps) {
         return std::erfc(root);
     }
     for (int k = terms - 1; k >= 1; --k) {
-        nested = 1.0 + nested * z / (static_cast<double>(k) + 0.5);
+        nested = 1.0 + nested * (z / (static_cast<double>(k) + 0.5));
     }
     constexpr double kTwoOverRootPi = 1.128379167095512573896158903121545172;
     return std::erfc(root) + kTwoOverRootPi * root * std::exp(-z) * nested;
@@ -117,6 +129,248 @@ double seriesLowerTail(double z, int halfSteps) {
     const double prefix =
         std::exp(-z) * std::pow(z, shape) / kHalfStepGammas[static_cast<std::size_t>(halfSteps)];
     return prefix * sum;
+}
+
+// x, x^2, x^4, x^8: the powers Estrin's scheme multiplies by.
+struct PowersOfTwo {
+    explicit PowersOfTwo(double x) : value{x, x * x, 0.0, 0.0} {
+        value[2] = value[1] * value[1];
+        value[3] = value[2] * value[2];
+    }
+    double value[4];
+};
+
+constexpr std::size_t largestPowerOfTwoBelow(std::size_t count) {
+    std::size_t power = 1;
+    while (2 * power < count) {
+        power *= 2;
+    }
+    return power;
+}
+
+constexpr std::size_t log2Exact(std::size_t power) {
+    std::size_t exponent = 0;
+    while (power > 1) {
+        power /= 2;
+        ++exponent;
+    }
+    return exponent;
+}
+
+// sum_{j < Count} c[First + j] x^j by Estrin's scheme, unrolled at compile time: the low half
+// plus x^h times the high half, recursively. Its chain of dependent operations grows with the
+// logarithm of the degree instead of the degree, which is what bounds the speed here.
+template <std::size_t First, std::size_t Count, std::size_t N>
+[[gnu::always_inline]] inline double estrin(const double (&c)[N], const PowersOfTwo& x) {
+    static_assert(Count >= 1 && First + Count <= N, "coefficients inside the table");
+    if constexpr (Count == 1) {
+        return c[First];
+    } else {
+        constexpr std::size_t kHalf = largestPowerOfTwoBelow(Count);
+        return estrin<First, kHalf>(c, x) +
+               x.value[log2Exact(kHalf)] * estrin<First + kHalf, Count - kHalf>(c, x);
+    }
+}
+
+// The whole polynomial, or its first M coefficients.
+template <std::size_t N>
+[[gnu::always_inline]] inline double polynomial(const double (&c)[N], const PowersOfTwo& x) {
+    return estrin<0, N>(c, x);
+}
+template <std::size_t M, std::size_t N>
+[[gnu::always_inline]] inline double polynomialLeading(const double (&c)[N], const PowersOfTwo& x) {
+    return estrin<0, M>(c, x);
+}
+
+// 1/(2m + 3) for m = 0, 1, ...: the series of (atanh(u) - u) / u^3 in u^2.
+constexpr double kAtanhSeries[] = {1.0 / 3,  1.0 / 5,  1.0 / 7,  1.0 / 9,  1.0 / 11,
+                                   1.0 / 13, 1.0 / 15, 1.0 / 17, 1.0 / 19, 1.0 / 21,
+                                   1.0 / 23, 1.0 / 25, 1.0 / 27};
+
+// sigma - log(1 + sigma) for |sigma| <= 0.4 without the cancellation of the plain difference:
+// with u = sigma / (2 + sigma), log(1 + sigma) = 2 atanh(u) and sigma - 2u = u sigma, so the value
+// is u sigma - 2u^3 (1/3 + u^2/5 + u^4/7 + ...). With u^2 <= 1/16 thirteen terms leave less than
+// 2^-54 of the sum; smaller u needs fewer.
+double logOnePlusDeficit(double sigma) {
+    const double u = sigma / (2.0 + sigma);
+    const double u2 = u * u;
+    const PowersOfTwo powers(u2);
+    double sum = 0.0;
+    if (u2 <= 1e-3) {
+        sum = polynomialLeading<6>(kAtanhSeries, powers);
+    } else if (u2 <= 1e-2) {
+        sum = polynomialLeading<8>(kAtanhSeries, powers);
+    } else {
+        sum = polynomial(kAtanhSeries, powers);
+    }
+    return u * sigma - 2.0 * u * u2 * sum;
+}
+
+// Coefficients of Temme's C_0(eta) .. C_8(eta), lowest degree first (C_9 is a constant); the
+// 53-bit set published with Boost.Math's incomplete gamma function.
+constexpr std::size_t kTemmePolynomials = 9;
+constexpr double kTemmeC9 = -0.00059676129019274625;
+constexpr double kTemmeC0[] = {
+    -0.33333333333333333,   0.083333333333333333,    -0.014814814814814815,
+    0.0011574074074074074,  0.0003527336860670194,   -0.00017875514403292181,
+    0.39192631785224378e-4, -0.21854485106799922e-5, -0.185406221071516e-5,
+    0.8296711340953086e-6,  -0.17665952736826079e-6, 0.67078535434014986e-8,
+    0.10261809784240308e-7, -0.43820360184533532e-8, 0.91476995822367902e-9};
+constexpr double kTemmeC1[] = {
+    -0.0018518518518518519,  -0.0034722222222222222, 0.0026455026455026455,
+    -0.00099022633744855967, 0.00020576131687242798, -0.40187757201646091e-6,
+    -0.18098550334489978e-4, 0.76491609160811101e-5, -0.16120900894563446e-5,
+    0.46471278028074343e-8,  0.1378633446915721e-6,  -0.5752545603517705e-7,
+    0.11951628599778147e-7};
+constexpr double kTemmeC2[] = {
+    0.0041335978835978836,   -0.0026813271604938272,  0.00077160493827160494,
+    0.20093878600823045e-5,  -0.00010736653226365161, 0.52923448829120125e-4,
+    -0.12760635188618728e-4, 0.34235787340961381e-7,  0.13721957309062933e-5,
+    -0.6298992138380055e-6,  0.14280614206064242e-6};
+constexpr double kTemmeC3[] = {
+    0.00064943415637860082, 0.00022947209362139918,  -0.00046918949439525571,
+    0.00026772063206283885, -0.75618016718839764e-4, -0.23965051138672967e-6,
+    0.11082654115347302e-4, -0.56749528269915966e-5, 0.14230900732435884e-5};
+constexpr double kTemmeC4[] = {-0.0008618882909167117,  0.00078403922172006663,
+                               -0.00029907248030319018, -0.14638452578843418e-5,
+                               0.66414982154651222e-4,  -0.39683650471794347e-4,
+                               0.11375726970678419e-4};
+constexpr double kTemmeC5[] = {
+    -0.00033679855336635815, -0.69728137583658578e-4, 0.00027727532449593921,
+    -0.00019932570516188848, 0.67977804779372078e-4,  0.1419062920643967e-6,
+    -0.13594048189768693e-4, 0.80184702563342015e-5,  -0.22914811765080952e-5};
+constexpr double kTemmeC6[] = {0.00053130793646399222,  -0.00059216643735369388,
+                               0.00027087820967180448,  0.79023532326603279e-6,
+                               -0.81539693675619688e-4, 0.56116827531062497e-4,
+                               -0.18329116582843376e-4};
+constexpr double kTemmeC7[] = {0.00034436760689237767, 0.51717909082605922e-4,
+                               -0.00033493161081142236, 0.0002812695154763237,
+                               -0.00010976582244684731};
+constexpr double kTemmeC8[] = {-0.00065262391859530942, 0.00083949872067208728,
+                               -0.00043829709854172101};
+
+template <std::size_t K>
+[[gnu::always_inline]] inline double temmeCoefficient(const PowersOfTwo& eta) {
+    static_assert(K <= kTemmePolynomials, "C_0 .. C_9 only");
+    if constexpr (K == 0) {
+        return polynomial(kTemmeC0, eta);
+    } else if constexpr (K == 1) {
+        return polynomial(kTemmeC1, eta);
+    } else if constexpr (K == 2) {
+        return polynomial(kTemmeC2, eta);
+    } else if constexpr (K == 3) {
+        return polynomial(kTemmeC3, eta);
+    } else if constexpr (K == 4) {
+        return polynomial(kTemmeC4, eta);
+    } else if constexpr (K == 5) {
+        return polynomial(kTemmeC5, eta);
+    } else if constexpr (K == 6) {
+        return polynomial(kTemmeC6, eta);
+    } else if constexpr (K == 7) {
+        return polynomial(kTemmeC7, eta);
+    } else if constexpr (K == 8) {
+        return polynomial(kTemmeC8, eta);
+    } else {
+        return kTemmeC9;
+    }
+}
+
+// sum_{k < count} C_k(eta) a^-k for the compile-time list k = 0 .. count - 1.
+template <std::size_t... K>
+[[gnu::always_inline]] inline double temmeSeries(const PowersOfTwo& eta,
+                                                 const PowersOfTwo& inverseShape,
+                                                 std::index_sequence<K...>) {
+    const double coefficients[] = {temmeCoefficient<K>(eta)...};
+    return polynomial(coefficients, inverseShape);
+}
+
+template <std::size_t Terms>
+[[gnu::always_inline]] inline double temmeSeries(const PowersOfTwo& eta,
+                                                 const PowersOfTwo& inverseShape) {
+    return temmeSeries(eta, inverseShape, std::make_index_sequence<Terms>{});
+}
+
+// Terms of the series in 1/a worth computing: |C_k| stays below 5e-3 on the window, so the terms
+// dropped at each shape are below 1e-18 against a leading term near 1/3.
+double temmeSeriesForShape(double eta, double shape) {
+    const PowersOfTwo etaPowers(eta);
+    const PowersOfTwo inverseShape(1.0 / shape);
+    if (shape >= 1e6) return temmeSeries<3>(etaPowers, inverseShape);
+    if (shape >= 1e4) return temmeSeries<4>(etaPowers, inverseShape);
+    if (shape >= 2e3) return temmeSeries<5>(etaPowers, inverseShape);
+    if (shape >= 5e2) return temmeSeries<6>(etaPowers, inverseShape);
+    if (shape >= 2e2) return temmeSeries<7>(etaPowers, inverseShape);
+    if (shape >= 1e2) return temmeSeries<8>(etaPowers, inverseShape);
+    return temmeSeries<10>(etaPowers, inverseShape);
+}
+
+// erfc(sqrt(y)) for y >= 0, given exp(-y): W. J. Cody's rational Chebyshev approximations
+// (Math. Comp. 23 (1969) 631; the coefficients of his CALERF). Beyond the first range they give
+// the scaled function exp(x^2) erfc(x), so the exponential the caller needs anyway is the only
+// one taken, and it is taken of y itself rather than of a rounded square.
+double erfcOfRoot(double y, double expMinusY) {
+    constexpr double kInverseRootPi = 0.56418958354775628695;
+    // erf(x) = x N(x^2) / D(x^2) for x <= 0.46875.
+    constexpr double kSmallNumerator[] = {3209.37758913846947, 377.485237685302021,
+                                          113.864154151050156, 3.1611237438705656,
+                                          0.185777706184603153};
+    constexpr double kSmallDenominator[] = {2844.23683343917062, 1282.61652607737228,
+                                            244.024637934444173, 23.6012909523441209, 1.0};
+    // exp(x^2) erfc(x) = N(x) / D(x) for 0.46875 < x <= 4.
+    constexpr double kMiddleNumerator[] = {
+        1230.33935479799725, 2051.07837782607147,  1712.04761263407058,
+        881.95222124176909,  298.635138197400131,  66.1191906371416295,
+        8.88314979438837594, 0.564188496988670089, 2.15311535474403846e-8};
+    constexpr double kMiddleDenominator[] = {
+        1230.33935480374942, 3439.36767414372164, 4362.61909014324716,
+        3290.79923573345963, 1621.38957456669019, 537.181101862009858,
+        117.693950891312499, 15.7449261107098347, 1.0};
+    // exp(x^2) erfc(x) = (1/sqrt(pi) - s N(s) / D(s)) / x with s = 1/x^2 for x > 4.
+    constexpr double kLargeNumerator[] = {6.58749161529837803e-4, 0.0160837851487422766,
+                                          0.125781726111229246,   0.360344899949804439,
+                                          0.305326634961232344,   0.0163153871373020978};
+    constexpr double kLargeDenominator[] = {0.00233520497626869185, 0.0605183413124413191,
+                                            0.527905102951428412,   1.87295284992346047,
+                                            2.56852019228982242,    1.0};
+    constexpr double kSmallLimit = 0.46875 * 0.46875;
+    constexpr double kMiddleLimit = 16.0;
+
+    const double x = std::sqrt(y);
+    if (y <= kSmallLimit) {
+        const PowersOfTwo powers(y);
+        return 1.0 -
+               x * polynomial(kSmallNumerator, powers) / polynomial(kSmallDenominator, powers);
+    }
+    if (y <= kMiddleLimit) {
+        const PowersOfTwo powers(x);
+        return expMinusY *
+               (polynomial(kMiddleNumerator, powers) / polynomial(kMiddleDenominator, powers));
+    }
+    const double inverseY = 1.0 / y;
+    const PowersOfTwo powers(inverseY);
+    const double tail =
+        inverseY * polynomial(kLargeNumerator, powers) / polynomial(kLargeDenominator, powers);
+    return expMinusY * ((kInverseRootPi - tail) / x);
+}
+
+// Temme's uniform asymptotic expansion (SIAM J. Math. Anal. 10 (1979) 757): with
+// sigma = (z - a)/a, eta = sign(sigma) sqrt(2 (sigma - log(1 + sigma))) and y = a eta^2 / 2,
+// the smaller tail is erfc(sqrt y)/2 +- exp(-y)/sqrt(2 pi a) sum_k C_k(eta) a^-k (+ for the upper
+// tail, z >= a).
+double temmeTail(bool upperTail, double z, double shape) {
+    constexpr double kTwoPi = 6.283185307179586476925286766559005768;
+    const double sigma = (z - shape) / shape;
+    const double deficit = logOnePlusDeficit(sigma);
+    const double y = shape * deficit;
+    const double eta = sigma < 0.0 ? -std::sqrt(2.0 * deficit) : std::sqrt(2.0 * deficit);
+
+    const double series = temmeSeriesForShape(eta, shape);
+    const double expMinusY = std::exp(-y);
+    const double correction = series * expMinusY / std::sqrt(kTwoPi * shape);
+    const bool upperIsSmaller = z >= shape;
+    const double smallerTail =
+        0.5 * erfcOfRoot(y, expMinusY) + (upperIsSmaller ? correction : -correction);
+    return upperTail == upperIsSmaller ? smallerTail : 1.0 - smallerTail;
 }
 
 double pairwiseSumRange(const double* values, std::size_t count) {
@@ -214,14 +468,20 @@ double gammaTail(bool upperTail, double z, double shape) {
     if (shape == 0.5) {
         return upperTail ? std::erfc(std::sqrt(z)) : std::erf(std::sqrt(z));
     }
+    const double temmeDistance =
+        shape >= kTemmeWideShape ? kTemmeWideDistance : kTemmeNarrowDistance;
+    if (shape >= kTemmeMinShape && std::fabs(z - shape) <= temmeDistance * shape) {
+        return temmeTail(upperTail, z, shape);
+    }
     const int halfSteps = finiteSumHalfSteps(shape);
     if (halfSteps >= 0 && z <= kMaxFiniteSumArgument) {
-        if (z >= shape - 1.0) {
+        // The finite sum has only positive terms, so it gives the upper tail to a few ulps
+        // everywhere; the lower tail takes it where that tail is the larger one.
+        if (upperTail || z >= shape - 1.0) {
             const double upper = finiteSumUpperTail(z, halfSteps);
             return upperTail ? upper : 1.0 - upper;
         }
-        const double lower = seriesLowerTail(z, halfSteps);
-        return upperTail ? 1.0 - lower : lower;
+        return seriesLowerTail(z, halfSteps);
     }
     // Boost in double is several times faster than promoted. For the tail containing the median,
     // and within the window, its error stays near the function's own conditioning (z f(z) / tail

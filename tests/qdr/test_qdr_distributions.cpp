@@ -123,9 +123,9 @@ TEST(QdrChiSquare, CentralFunctionsMatchFiftyDigitValues) {
     EXPECT_EQ(qdr_GetChiSqPdf(0.0, 2.0), 0.5);
 }
 
-// Whole and half-whole shapes up to 50 take a finite sum, good to a few ulps in both tails on
-// either side of the median; the rest go to the incomplete gamma function, held to the
-// conditioning budget.
+// Whole and half-whole shapes up to 50 are good to a few ulps in both tails on either side of the
+// median (a finite sum, or from shape 20 on Temme's expansion near the median); the rest are held
+// to the conditioning budget.
 TEST(QdrGamma, DistributionFunctionMatchesFiftyDigitValuesInBothTails) {
     double worstFiniteSum = 0.0;
     double worstGeneral = 0.0;
@@ -159,6 +159,29 @@ TEST(QdrGamma, DistributionFunctionMatchesFiftyDigitValuesInBothTails) {
                      qdr_GetGammaCdf(QDR_LOWER_TAIL, 3.0, 3.0, 1.0, 0.0));
     EXPECT_EQ(qdr_GetGammaCdf(QDR_LOWER_TAIL, -1.0, 3.0, 1.0, 0.0), 0.0);
     EXPECT_EQ(qdr_GetGammaCdf(QDR_UPPER_TAIL, kInf, 3.0, 1.0, 0.0), 0.0);
+}
+
+// Large shapes near the median take Temme's expansion with as many terms in 1/shape as the shape
+// needs; each switch of the term count and of the window's width is swept on both sides.
+TEST(QdrGamma, LargeShapesNearTheMedianStayWithinTheConditioning) {
+    double worst = 0.0;
+    for (double shape : {20.0, 39.5, 40.0, 99.5, 100.0, 199.5, 200.0, 499.5, 500.0, 1999.5, 2000.0,
+                         9999.5, 1e4, 3e5, 1e6, 1e8}) {
+        for (int step = -40; step <= 40; step += 3) {
+            const double z = shape * (1.0 + step / 100.0);
+            for (int tail : {QDR_LOWER_TAIL, QDR_UPPER_TAIL}) {
+                const Wide exact = tail == QDR_LOWER_TAIL
+                                       ? boost::math::gamma_p(Wide(shape), Wide(z), QuietPolicy())
+                                       : boost::math::gamma_q(Wide(shape), Wide(z), QuietPolicy());
+                if (exact > 1e-290) {
+                    worst =
+                        std::max(worst, conditionedUlps(qdr_GetGammaCdf(tail, z, shape, 1.0, 0.0),
+                                                        exact, shape, z));
+                }
+            }
+        }
+    }
+    EXPECT_LE(worst, 1.0);
 }
 
 TEST(QdrSampleMoments, TwoPassMomentsAreAccurateOnShiftedData) {
