@@ -90,28 +90,31 @@ int finiteSumHalfSteps(double shape) {
     return static_cast<int>(twice);
 }
 
+double erfcOfRoot(double y, double expMinusY);
+
 // Upper tail of a whole shape n: exp(-z) * sum_{k<n} z^k / k!; of a half-whole shape m + 1/2:
 // erfc(sqrt z) + exp(-z) sum_{k<m} z^{k+1/2} / Gamma(k + 3/2). Both sums in nested form, so that
 // the rounding of each level is damped by the next; the ratios z/k do not depend on the running
 // value, so their divisions stay off its chain of dependent operations.
 double finiteSumUpperTail(double z, int halfSteps) {
+    const double expMinusZ = std::exp(-z);
     double nested = 1.0;
     if (halfSteps % 2 == 0) {
         for (int k = halfSteps / 2 - 1; k >= 1; --k) {
             nested = 1.0 + nested * (z / static_cast<double>(k));
         }
-        return std::exp(-z) * nested;
+        return expMinusZ * nested;
     }
-    const double root = std::sqrt(z);
+    const double complement = erfcOfRoot(z, expMinusZ);
     const int terms = halfSteps / 2;
     if (terms == 0) {
-        return std::erfc(root);
+        return complement;
     }
     for (int k = terms - 1; k >= 1; --k) {
         nested = 1.0 + nested * (z / (static_cast<double>(k) + 0.5));
     }
     constexpr double kTwoOverRootPi = 1.128379167095512573896158903121545172;
-    return std::erfc(root) + kTwoOverRootPi * root * std::exp(-z) * nested;
+    return complement + kTwoOverRootPi * std::sqrt(z) * expMinusZ * nested;
 }
 
 // Lower tail exp(-z) z^a / Gamma(a + 1) * sum_j z^j / ((a+1)...(a+j)) for z < a - 1: all terms
