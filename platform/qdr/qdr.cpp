@@ -49,6 +49,9 @@ constexpr double kTemmeWideShape = 40.0;
 constexpr double kTemmeNarrowDistance = 0.3;
 constexpr double kTemmeWideDistance = 0.4;
 
+// exp(-40) < 2^-57.
+constexpr double kSaturationExponent = 40.0;
+
 // The series for the lower tail converges geometrically for z < shape - 1 <= 49.5; this cap is
 // far above the ~60 terms it needs and only guards the loop.
 constexpr int kMaxSeriesTerms = 1000;
@@ -531,6 +534,14 @@ double gammaTail(bool upperTail, double z, double shape) {
     }
     if (shape == 0.5) {
         return upperTail ? std::erfc(std::sqrt(z)) : std::erf(std::sqrt(z));
+    }
+    // Far from the shape the smaller tail is below exp(-a (r - 1 - ln r)), r = z/a (Chernoff's
+    // bound); once that is under 2^-57 the larger tail rounds to exactly 1, whatever the route.
+    const double ratio = z / shape;
+    const bool upperIsLarger = ratio < 1.0;
+    if (upperTail == upperIsLarger && (ratio >= 2.0 || ratio <= 0.5) &&
+        shape * (ratio - 1.0 - std::log(ratio)) > kSaturationExponent) {
+        return 1.0;
     }
     const double temmeDistance =
         shape >= kTemmeWideShape ? kTemmeWideDistance : kTemmeNarrowDistance;
