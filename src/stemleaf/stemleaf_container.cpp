@@ -257,9 +257,27 @@ std::int32_t runStemAndLeaf(const double* column, std::uint32_t n,
             base += step;
         }
         const bool isEmpty = position >= retainedEnd || nextQuotient > upperEdge;
+        if (isEmpty) {
+            // This line and the empty ones after it, up to the line that takes the next value
+            // and short of the step from the -0 line to the +0 line, in one tight loop.
+            std::int64_t more = lineCount - 1 - i;
+            if (position < retainedEnd)
+                more = std::min(more, (nextQuotient - upperEdge - 1) / step);
+            if (negativeSide) more = std::min(more, -base / step);
+            more = std::max<std::int64_t>(more, 0);  // never backwards, whatever the column
+            const std::int32_t isPositive = negativeSide ? 0 : 1;
+            for (std::int64_t j = i; j <= i + more; ++j) {
+                kel_StemAndLeafLine& line = display.lines[j];
+                line.stem = static_cast<std::int32_t>((base + (j - i) * step) / 10);
+                line.isPositive = isPositive;
+            }
+            upperEdge += more * step;
+            base += more * step;
+            i += more;
+            continue;
+        }
         const std::int64_t next =
-            isEmpty ? position
-                    : findDepth(quotients, position, retainedEnd, upperEdge, negativeSide);
+            findDepth(quotients, position, retainedEnd, upperEdge, negativeSide);
 
         kel_StemAndLeafLine& line = display.lines[i];
         const std::int64_t stem = base / 10;

@@ -256,6 +256,43 @@ TEST(StemLeafProperties, RandomColumnsMatchTheSlowConstruction) {
     EXPECT_GT(saturated, 0);
 }
 
+// A few values spread over thousands of lines: long runs of empty lines on both sides of zero,
+// ending at the -0 line, at a value's line, or at the display's end.
+TEST(StemLeafProperties, SparseColumnsAcrossZeroMatchTheSlowConstruction) {
+    ColumnMaker maker;
+    for (int column = 0; column < 600; ++column) {
+        const auto n = static_cast<std::size_t>(maker.integer(1, 6));
+        std::vector<double> x(n);
+        for (double& value : x) {
+            value = static_cast<double>(maker.integer(-4000, 4000)) / 2.0;
+            if (maker.integer(0, 5) == 0) value = -value * 0.0;  // a -0 or +0 now and then
+        }
+        std::sort(x.begin(), x.end());
+        kel_StemAndLeafScaleInfo scale{};
+        scale.leafUnit = maker.integer(0, 1) ? 1.0 : 0.5;
+        const double widths[] = {1.0, 2.0, 5.0, 10.0};
+        scale.leavesPerLine = widths[maker.integer(0, 3)];
+        scale.trimOutliers = maker.integer(0, 1) ? 1 : 0;
+        SCOPED_TRACE(::testing::Message() << "column " << column << " n " << n << " leaf unit "
+                                          << scale.leafUnit << " per line " << scale.leavesPerLine);
+        Display expected;
+        const std::int32_t expectedCode = buildSlowly(x, scale, expected);
+        kel_StemAndLeaf* container = kel_CreateStemAndLeafContainer();
+        const std::int32_t code =
+            kel_RunStemAndLeaf(x.data(), static_cast<std::uint32_t>(n), &scale, container);
+        ASSERT_EQ(code, expectedCode);
+        if (code == KEL_OK) {
+            Display actual = testing::copyDisplay(*container);
+            expectEveryValueOnce(actual, x);
+            expectDepthsFromTheNearerEnd(actual);
+            for (Line& line : actual.lines) line.depth = 0;
+            actual.medianLine = -1;
+            ASSERT_EQ(actual, expected);
+        }
+        kel_DeleteStemAndLeafContainer(&container);
+    }
+}
+
 TEST(StemLeafProperties, ColumnsOutOfOrderAnywhereAreRefusedUntouched) {
     // One pair swapped, or one NaN, at any place: among the low outliers, on any line (inside a
     // block or across blocks of the leaf pass), among the high outliers.
