@@ -571,6 +571,47 @@ double gammaTail(bool upperTail, double z, double shape) {
                      : boost::math::gamma_p(shape, z, AccuratePolicy());
 }
 
+// Quantile of the unit-scale gamma distribution for shapes from kHalleyMinShape on: Halley's
+// method on the smaller tail, through gammaTail, from the Wilson-Hilferty approximation. Several
+// times faster than Boost's promoted inversion and as accurate (the tail is good to a few ulps
+// of its conditioning). NaN when the iteration does not settle, for the caller to fall back.
+double gammaQuantile(double p, double shape) {
+    constexpr int kMaxHalleySteps = 60;
+    const bool useUpper = p > 0.5;
+    const double target = useUpper ? 1.0 - p : p;  // exact for p > 1/2
+    // Wilson-Hilferty: (z / a)^(1/3) is nearly normal with mean 1 - 1/(9a), variance 1/(9a).
+    const double ninth = 1.0 / (9.0 * shape);
+    const double cubeRoot = 1.0 - ninth + normalQuantile(p) * std::sqrt(ninth);
+    double z = cubeRoot > 0.0 ? shape * cubeRoot * cubeRoot * cubeRoot : 0.5 * shape * p;
+    double low = 0.0;
+    double high = kInfinity;
+    for (int step = 0; step < kMaxHalleySteps; ++step) {
+        // Residual increasing in z in both cases.
+        const double residual =
+            useUpper ? target - gammaTail(true, z, shape) : gammaTail(false, z, shape) - target;
+        if (residual == 0.0) return z;
+        if (residual < 0.0) {
+            low = z;
+        } else {
+            high = z;
+        }
+        const double density = boost::math::gamma_p_derivative(shape, z, FastPolicy());
+        if (!(density > 0.0) || !std::isfinite(density)) return kNaN;
+        double change = residual / density;
+        // Halley: the density's logarithmic slope is (a - 1)/z - 1.
+        const double factor = 1.0 - 0.5 * change * ((shape - 1.0) / z - 1.0);
+        if (factor > 0.5) change /= factor;
+        if (std::fabs(change) <= 2.0 * kEpsilon * z) return z - change;
+        double next = z - change;
+        if (!(next > low && next < high)) {
+            next = std::isinf(high) ? 2.0 * z : 0.5 * (low + high);
+        }
+        if (std::isfinite(high) && high - low <= 2.0 * kEpsilon * high) return next;
+        z = next;
+    }
+    return kNaN;
+}
+
 }  // namespace qdr_detail
 }  // namespace kelstat
 
@@ -658,6 +699,10 @@ double qdr_GetChiSqInvCdf(double p, double df, double ncp) {
         return kInfinity;
     }
     if (ncp == 0.0) {
+        if (0.5 * df >= kelstat::qdr_detail::kHalleyMinShape) {
+            const double half = kelstat::qdr_detail::gammaQuantile(p, 0.5 * df);
+            if (!std::isnan(half)) return 2.0 * half;
+        }
         return boost::math::quantile(
             boost::math::chi_squared_distribution<double, AccuratePolicy>(df), p);
     }

@@ -55,6 +55,13 @@ double chiSquareOneDfTail(bool upperTail, double x, double lambda);
 // Noncentral t quantile for finite df > 0 and finite ncp != 0 (NaN when it cannot be computed).
 double noncentralTQuantile(double p, double df, double ncp);
 
+// Shapes from which gammaQuantile is used; below, the Wilson-Hilferty start is too rough.
+constexpr double kHalleyMinShape = 2.0;
+
+// Gamma(shape, 1) quantile for shape >= kHalleyMinShape and 0 < p < 1, or NaN if the iteration
+// does not settle.
+double gammaQuantile(double p, double shape);
+
 // Gamma distribution function of the unit-scale variable z >= 0: lower tail P(G <= z) when
 // upperTail is false, else P(G > z).
 double gammaTail(bool upperTail, double z, double shape);
