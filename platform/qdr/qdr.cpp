@@ -20,10 +20,6 @@ namespace kelstat {
 namespace qdr_detail {
 namespace {
 
-constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
-constexpr double kInfinity = std::numeric_limits<double>::infinity();
-constexpr double kEpsilon = std::numeric_limits<double>::epsilon();
-
 // Below this many values the pairwise recursion stops and four running sums take over; large
 // enough to amortise the recursion, small enough that the plain sums stay accurate.
 constexpr std::size_t kPairwiseBlock = 256;
@@ -522,6 +518,11 @@ double normalQuantile(double p) {
     return -M_SQRT2 * boost::math::erfc_inv(2.0 * p, AccuratePolicy());
 }
 
+double roughNormalQuantile(double p) {
+    if (!(p > 0.0 && p < 1.0)) return normalQuantile(p);
+    return -M_SQRT2 * boost::math::erfc_inv(2.0 * p, FastPolicy());
+}
+
 double gammaTail(bool upperTail, double z, double shape) {
     if (z <= 0.0) {
         return upperTail ? 1.0 : 0.0;
@@ -537,11 +538,9 @@ double gammaTail(bool upperTail, double z, double shape) {
     }
     // Far from the shape the smaller tail is below exp(-a (r - 1 - ln r)), r = z/a (Chernoff's
     // bound); once that is under 2^-57 the larger tail rounds to exactly 1, whatever the route.
-    const double ratio = z / shape;
-    const bool upperIsLarger = ratio < 1.0;
-    if (upperTail == upperIsLarger && (ratio >= 2.0 || ratio <= 0.5) &&
-        shape * (ratio - 1.0 - std::log(ratio)) > kSaturationExponent) {
-        return 1.0;
+    if (upperTail == (z < shape) && (z >= 2.0 * shape || z <= 0.5 * shape)) {
+        const double ratio = z / shape;
+        if (shape * (ratio - 1.0 - std::log(ratio)) > kSaturationExponent) return 1.0;
     }
     const double temmeDistance =
         shape >= kTemmeWideShape ? kTemmeWideDistance : kTemmeNarrowDistance;
@@ -581,7 +580,7 @@ double gammaQuantile(double p, double shape) {
     const double target = useUpper ? 1.0 - p : p;  // exact for p > 1/2
     // Wilson-Hilferty: (z / a)^(1/3) is nearly normal with mean 1 - 1/(9a), variance 1/(9a).
     const double ninth = 1.0 / (9.0 * shape);
-    const double cubeRoot = 1.0 - ninth + normalQuantile(p) * std::sqrt(ninth);
+    const double cubeRoot = 1.0 - ninth + roughNormalQuantile(p) * std::sqrt(ninth);
     double z = cubeRoot > 0.0 ? shape * cubeRoot * cubeRoot * cubeRoot : 0.5 * shape * p;
     double low = 0.0;
     double high = kInfinity;
@@ -616,11 +615,10 @@ double gammaQuantile(double p, double shape) {
 }  // namespace kelstat
 
 using kelstat::qdr_detail::AccuratePolicy;
+using kelstat::qdr_detail::kInfinity;
+using kelstat::qdr_detail::kNaN;
 
 namespace {
-
-constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
-constexpr double kInfinity = std::numeric_limits<double>::infinity();
 
 // The noncentral chi-square beyond one degree of freedom is a Poisson-weighted series whose
 // length grows with the noncentrality: past these sizes it runs for minutes, so the answer is NaN.

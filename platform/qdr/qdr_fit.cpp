@@ -14,9 +14,6 @@ namespace kelstat {
 namespace qdr_detail {
 namespace {
 
-constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
-constexpr double kEpsilon = std::numeric_limits<double>::epsilon();
-
 // Newton on the shape equation converges monotonically from Minka's start in 2-4 steps.
 constexpr int kGammaMaxIterations = 100;
 

@@ -4,7 +4,6 @@
 #include <array>
 #include <boost/math/distributions/non_central_t.hpp>
 #include <boost/math/distributions/students_t.hpp>
-#include <boost/math/special_functions/erf.hpp>
 #include <cmath>
 #include <cstddef>
 #include <limits>
@@ -17,9 +16,6 @@ namespace kelstat {
 namespace qdr_detail {
 namespace {
 
-constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
-constexpr double kInfinity = std::numeric_limits<double>::infinity();
-constexpr double kEpsilon = std::numeric_limits<double>::epsilon();
 constexpr double kOneOverRootTwoPi = 0.398942280401432677939946059934;
 
 double standardNormalDensity(double x) {
@@ -239,13 +235,10 @@ double chiSquareOneDfQuantile(double p, double lambda) {
     const double mu = std::sqrt(lambda);
     // The root lies in [max(mu + z_p, z_{(1+p)/2}), mu + z_{(1+p)/2}]: P(|Z + mu| <= r) is at most
     // P(|Z| <= r) and at most Phi(r - mu), and at least 1 - 2 Phi(mu - r). The quantiles only
-    // bound the search, so Boost's double evaluation (good to a few ulps, several times faster
-    // than the promoted one) serves, with the bracket widened well beyond its error.
+    // bound the search, so the rough ones serve, with the bracket widened well beyond their error.
     constexpr double kBracketWidening = 64.0 * kEpsilon;
-    const double symmetricQuantile =
-        M_SQRT2 * boost::math::erfc_inv(1.0 - p, kelstat::qdr_detail::FastPolicy());
-    const double lowerQuantile =
-        -M_SQRT2 * boost::math::erfc_inv(2.0 * p, kelstat::qdr_detail::FastPolicy());
+    const double symmetricQuantile = -roughNormalQuantile(0.5 * (1.0 - p));
+    const double lowerQuantile = roughNormalQuantile(p);
     double low = std::max({0.0, mu + lowerQuantile, symmetricQuantile});
     double high = mu + symmetricQuantile;
     low *= 1.0 - kBracketWidening;
