@@ -4,30 +4,21 @@
 #define KELSTAT_TESTS_SPECFUN_REFERENCE_TABLE_H
 
 #include <cstdlib>
-#include <fstream>
 #include <iomanip>
 #include <sstream>
 #include <string>
 #include <vector>
+
+#include "csv_table.h"
 
 namespace kelstat_test {
 
 // Rows of numbers from tests/data/<name>; empty when the file cannot be read.
 inline std::vector<std::vector<double>> readReferenceTable(const std::string& name) {
     std::vector<std::vector<double>> rows;
-    std::ifstream in(std::string(KELSTAT_TEST_DATA_DIR) + "/" + name);
-    std::string line;
-    bool headerSeen = false;
-    while (std::getline(in, line)) {
-        if (line.empty() || line[0] == '#') continue;
-        if (!headerSeen) {
-            headerSeen = true;
-            continue;
-        }
+    for (const std::vector<std::string>& fields : readCsv(name)) {
         std::vector<double> row;
-        std::stringstream fields(line);
-        std::string field;
-        while (std::getline(fields, field, ',')) row.push_back(std::strtod(field.c_str(), nullptr));
+        for (const std::string& field : fields) row.push_back(std::strtod(field.c_str(), nullptr));
         rows.push_back(row);
     }
     return rows;

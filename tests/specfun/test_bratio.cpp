@@ -6,15 +6,15 @@
 #include <boost/math/special_functions/gamma.hpp>
 #include <boost/multiprecision/cpp_bin_float.hpp>
 #include <cmath>
-#include <fstream>
 #include <iomanip>
 #include <iostream>
+#include <iterator>
 #include <limits>
 #include <map>
-#include <sstream>
 #include <string>
 #include <vector>
 
+#include "csv_table.h"
 #include "specfun/bratio.h"
 #include "specfun/bratio_table.h"
 
@@ -59,25 +59,15 @@ struct ReferenceRow {
 };
 
 std::vector<ReferenceRow> loadReference() {
-    std::ifstream in(std::string(KELSTAT_TEST_DATA_DIR) + "/bratio_reference.csv");
     std::vector<ReferenceRow> rows;
-    std::string line;
-    bool headerSeen = false;
-    while (std::getline(in, line)) {
-        if (line.empty() || line[0] == '#') continue;
-        if (!headerSeen) {
-            headerSeen = true;
-            continue;
-        }
-        std::istringstream fields(line);
+    for (const std::vector<std::string>& fields : kelstat_test::readCsv("bratio_reference.csv")) {
+        if (fields.size() < 9) continue;
         ReferenceRow row;
-        std::string field;
-        std::getline(fields, row.regime, ',');
+        row.regime = fields[0];
         double* const targets[] = {&row.a, &row.b,  &row.x,          &row.y,
                                    &row.w, &row.w1, &row.conditionW, &row.conditionW1};
-        for (double* target : targets) {
-            std::getline(fields, field, ',');
-            *target = std::strtod(field.c_str(), nullptr);
+        for (std::size_t i = 0; i < std::size(targets); ++i) {
+            *targets[i] = std::strtod(fields[i + 1].c_str(), nullptr);
         }
         rows.push_back(row);
     }
@@ -294,8 +284,8 @@ TEST(BratioAuxiliary, MachineConstantsAreIeeeDouble) {
 // The published listing numbers each set from the highest power down; the table holds it by
 // power, constant term first, with the leading 1 of some denominators added.
 TEST(BratioAuxiliary, ErrorFunctionTableMatchesSecondTranscription) {
-    std::ifstream in(std::string(KELSTAT_TEST_DATA_DIR) + "/bratio_erf_coefficients.csv");
-    ASSERT_TRUE(in.good());
+    const auto rows = kelstat_test::readCsv("bratio_erf_coefficients.csv");
+    ASSERT_FALSE(rows.empty());
     const std::map<std::string, std::vector<double>> table = {
         {"A", {std::begin(erf_table::kSmallNumerator), std::end(erf_table::kSmallNumerator)}},
         {"B", {std::begin(erf_table::kSmallDenominator), std::end(erf_table::kSmallDenominator)}},
@@ -305,14 +295,11 @@ TEST(BratioAuxiliary, ErrorFunctionTableMatchesSecondTranscription) {
         {"S", {std::begin(erf_table::kLargeDenominator), std::end(erf_table::kLargeDenominator)}},
     };
     int compared = 0;
-    std::string line;
-    while (std::getline(in, line)) {
-        if (line.empty() || line[0] == '#' || line.rfind("set,", 0) == 0) continue;
-        std::istringstream fields(line);
-        std::string set, index, value;
-        std::getline(fields, set, ',');
-        std::getline(fields, index, ',');
-        std::getline(fields, value, ',');
+    for (const std::vector<std::string>& fields : rows) {
+        ASSERT_EQ(fields.size(), 3u);
+        const std::string& set = fields[0];
+        const std::string& index = fields[1];
+        std::string value = fields[2];
         std::replace(value.begin(), value.end(), 'D', 'e');
         const std::vector<double>& coefficients = table.at(set);
         const std::size_t position = coefficients.size() - std::stoul(index);

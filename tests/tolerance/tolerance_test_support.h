@@ -5,34 +5,14 @@
 #include <cmath>
 #include <cstdint>
 #include <cstring>
-#include <fstream>
-#include <sstream>
 #include <string>
 #include <vector>
 
+#include "csv_table.h"
+
 namespace kelstat::testing {
 
-// Rows of a CSV under tests/data: comment lines (#) and the header line are skipped; every other
-// line is split at commas into strings.
-inline std::vector<std::vector<std::string>> readCsv(const std::string& name) {
-    std::ifstream in(std::string(KELSTAT_TEST_DATA_DIR) + "/" + name);
-    std::vector<std::vector<std::string>> rows;
-    std::string line;
-    bool headerSeen = false;
-    while (std::getline(in, line)) {
-        if (line.empty() || line[0] == '#') continue;
-        if (!headerSeen) {
-            headerSeen = true;
-            continue;
-        }
-        std::vector<std::string> fields;
-        std::stringstream stream(line);
-        std::string field;
-        while (std::getline(stream, field, ',')) fields.push_back(field);
-        rows.push_back(fields);
-    }
-    return rows;
-}
+using kelstat_test::readCsv;
 
 inline uint64_t bitsOf(double value) {
     uint64_t bits = 0;
