@@ -11,15 +11,12 @@
 #include <vector>
 
 #include "qdr.h"
+#include "wide_oracle.h"
 
 namespace {
 
-using Wide = boost::multiprecision::cpp_bin_float_50;
-using QuietPolicy = boost::math::policies::policy<
-    boost::math::policies::domain_error<boost::math::policies::ignore_error>,
-    boost::math::policies::pole_error<boost::math::policies::ignore_error>,
-    boost::math::policies::overflow_error<boost::math::policies::ignore_error>,
-    boost::math::policies::evaluation_error<boost::math::policies::ignore_error>>;
+using Wide = kelstat_test::Wide;
+using QuietPolicy = kelstat_test::QuietPolicy;
 
 constexpr double kEpsilon = std::numeric_limits<double>::epsilon();
 const double kNaN = std::numeric_limits<double>::quiet_NaN();

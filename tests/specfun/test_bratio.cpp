@@ -17,16 +17,13 @@
 #include "csv_table.h"
 #include "specfun/bratio.h"
 #include "specfun/bratio_table.h"
+#include "wide_oracle.h"
 
 namespace kelstat {
 namespace {
 
-using Real = boost::multiprecision::cpp_bin_float_50;
-using QuietPolicy = boost::math::policies::policy<
-    boost::math::policies::domain_error<boost::math::policies::ignore_error>,
-    boost::math::policies::pole_error<boost::math::policies::ignore_error>,
-    boost::math::policies::overflow_error<boost::math::policies::ignore_error>,
-    boost::math::policies::evaluation_error<boost::math::policies::ignore_error>>;
+using Real = kelstat_test::Wide;
+using QuietPolicy = kelstat_test::QuietPolicy;
 
 constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
 constexpr double kInf = std::numeric_limits<double>::infinity();

@@ -19,16 +19,12 @@
 #include "reference_table.h"
 #include "specfun/gamma_functions.h"
 #include "specfun/incomplete_gamma_table.h"
+#include "wide_oracle.h"
 
 namespace {
 
-using Real = boost::multiprecision::cpp_bin_float_50;
-using NoThrow = boost::math::policies::policy<
-    boost::math::policies::domain_error<boost::math::policies::ignore_error>,
-    boost::math::policies::pole_error<boost::math::policies::ignore_error>,
-    boost::math::policies::overflow_error<boost::math::policies::ignore_error>,
-    boost::math::policies::underflow_error<boost::math::policies::ignore_error>,
-    boost::math::policies::evaluation_error<boost::math::policies::ignore_error>>;
+using Real = kelstat_test::Wide;
+using NoThrow = kelstat_test::QuietPolicy;
 using kelstat::mIncompleteGamma;
 using kelstat::XGAMMA;
 using kelstat::XGAMMLN;
