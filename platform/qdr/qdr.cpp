@@ -354,9 +354,9 @@ template <std::size_t Terms>
 // Terms of the series in 1/a worth computing: on the window |C_0| <= 0.39 and |C_k| <= 6e-3 for
 // k >= 1, so at each shape the terms dropped add up to less than 8e-18, a fortieth of an ulp
 // against a sum near 1/3.
-double temmeSeriesForShape(double eta, double shape) {
+double temmeSeriesForShape(double eta, double shape, double reciprocalShape) {
     const PairPowers etaPowers(eta);
-    const PowersOfTwo inverseShape(1.0 / shape);
+    const PowersOfTwo inverseShape(reciprocalShape);
     if (shape >= 1e5) return temmeSeries<3>(etaPowers, inverseShape);
     if (shape >= 5e3) return temmeSeries<4>(etaPowers, inverseShape);
     if (shape >= 1e3) return temmeSeries<5>(etaPowers, inverseShape);
@@ -423,11 +423,12 @@ double erfcOfRoot(double y, double expMinusY) {
 // tail, z >= a).
 double temmeTail(bool upperTail, double z, double shape) {
     constexpr double kTwoPi = 6.283185307179586476925286766559005768;
-    const double twoOverShape = 2.0 / shape;
+    const double reciprocalShape = 1.0 / shape;
+    const double twoOverShape = 2.0 * reciprocalShape;  // exactly 2 / shape
     const double y = scaledLogOnePlusDeficit(z, shape);
     const double eta = z < shape ? -std::sqrt(twoOverShape * y) : std::sqrt(twoOverShape * y);
 
-    const double series = temmeSeriesForShape(eta, shape);
+    const double series = temmeSeriesForShape(eta, shape, reciprocalShape);
     const double expMinusY = std::exp(-y);
     const double correction = series * expMinusY / std::sqrt(kTwoPi * shape);
     const bool upperIsSmaller = z >= shape;
