@@ -14,16 +14,12 @@
 #include <string>
 #include <vector>
 
+#include "../support/wide_oracle.h"
+
 namespace {
 
-using Real = boost::multiprecision::cpp_bin_float_50;
-
-using QuietPolicy = boost::math::policies::policy<
-    boost::math::policies::domain_error<boost::math::policies::ignore_error>,
-    boost::math::policies::pole_error<boost::math::policies::ignore_error>,
-    boost::math::policies::overflow_error<boost::math::policies::ignore_error>,
-    boost::math::policies::underflow_error<boost::math::policies::ignore_error>,
-    boost::math::policies::evaluation_error<boost::math::policies::ignore_error>>;
+using Real = kelstat_test::Wide;
+using QuietPolicy = kelstat_test::QuietPolicy;
 
 // The two arguments as BRATIO receives them. When x + y = 1 cannot hold exactly in double (the
 // smaller one below 2^-54), the smaller one is exact and defines the reference.
