@@ -3,6 +3,7 @@
 // qdr_fit.cpp.
 #include "qdr.h"
 
+#include <algorithm>
 #include <array>
 #include <boost/math/distributions/chi_squared.hpp>
 #include <boost/math/distributions/non_central_chi_squared.hpp>
@@ -35,6 +36,10 @@ constexpr double kMaxFiniteSumArgument = 700.0;
 // exceed ~1e-15 and the integrands of the tolerance factors live) take the double evaluation.
 constexpr double kFastWindowDeviations = 8.0;
 
+// The term-by-term series for the lower tail converges geometrically for z < shape - 1; this cap
+// is far above the terms it needs and only guards the loop.
+constexpr int kMaxSeriesTerms = 1000;
+
 // Shapes from kTemmeMinShape on, with the argument within a relative distance of the shape, take
 // Temme's uniform expansion: there its error stays within the function's own conditioning (the
 // effect of rounding the argument), at a fraction of the cost of a series or a long finite sum.
@@ -48,37 +53,7 @@ constexpr double kTemmeWideDistance = 0.4;
 // exp(-40) < 2^-57.
 constexpr double kSaturationExponent = 40.0;
 
-// The series for the lower tail converges geometrically for z < shape - 1 <= 49.5; this cap is
-// far above the ~60 terms it needs and only guards the loop.
-constexpr int kMaxSeriesTerms = 1000;
-
-constexpr std::size_t kHalfStepCount = 2 * kMaxFiniteSumShape + 2;
 constexpr long double kRootPi = 1.772453850905516027298167483341145183L;
-
-// Gamma(h/2 + 1) for h = 0..2*kMaxFiniteSumShape + 1 (so shape! for whole and half-whole shapes),
-// by the recurrence Gamma(z + 1) = z Gamma(z) from Gamma(1) = 1 and Gamma(3/2) = sqrt(pi)/2,
-// accumulated in long double and rounded once.
-constexpr std::array<double, kHalfStepCount> makeHalfStepGammas() {
-    std::array<double, kHalfStepCount> table{};
-    long double whole = 1.0L;
-    long double half = 0.5L * kRootPi;
-    for (std::size_t h = 0; h < kHalfStepCount; ++h) {
-        const long double shape = 0.5L * static_cast<long double>(h);
-        if (h % 2 == 0) {
-            if (h > 0) {
-                whole *= shape;
-            }
-            table[h] = static_cast<double>(whole);
-        } else {
-            if (h > 1) {
-                half *= shape;
-            }
-            table[h] = static_cast<double>(half);
-        }
-    }
-    return table;
-}
-constexpr std::array<double, kHalfStepCount> kHalfStepGammas = makeHalfStepGammas();
 
 // 2 * shape when the shape is a whole or half-whole number up to kMaxFiniteSumShape, else -1.
 int finiteSumHalfSteps(double shape) {
@@ -87,51 +62,6 @@ int finiteSumHalfSteps(double shape) {
         return -1;
     }
     return static_cast<int>(twice);
-}
-
-double erfcOfRoot(double y, double expMinusY);
-
-// Upper tail of a whole shape n: exp(-z) * sum_{k<n} z^k / k!; of a half-whole shape m + 1/2:
-// erfc(sqrt z) + exp(-z) sum_{k<m} z^{k+1/2} / Gamma(k + 3/2). Both sums in nested form, so that
-// the rounding of each level is damped by the next; the ratios z/k do not depend on the running
-// value, so their divisions stay off its chain of dependent operations.
-double finiteSumUpperTail(double z, int halfSteps) {
-    const double expMinusZ = std::exp(-z);
-    double nested = 1.0;
-    if (halfSteps % 2 == 0) {
-        for (int k = halfSteps / 2 - 1; k >= 1; --k) {
-            nested = 1.0 + nested * (z / static_cast<double>(k));
-        }
-        return expMinusZ * nested;
-    }
-    const double complement = erfcOfRoot(z, expMinusZ);
-    const int terms = halfSteps / 2;
-    if (terms == 0) {
-        return complement;
-    }
-    for (int k = terms - 1; k >= 1; --k) {
-        nested = 1.0 + nested * (z / (static_cast<double>(k) + 0.5));
-    }
-    constexpr double kTwoOverRootPi = 1.128379167095512573896158903121545172;
-    return complement + kTwoOverRootPi * std::sqrt(z) * expMinusZ * nested;
-}
-
-// Lower tail exp(-z) z^a / Gamma(a + 1) * sum_j z^j / ((a+1)...(a+j)) for z < a - 1: all terms
-// positive and decreasing, so the small tail keeps its relative accuracy.
-double seriesLowerTail(double z, int halfSteps) {
-    const double shape = 0.5 * static_cast<double>(halfSteps);
-    double term = 1.0;
-    double sum = 1.0;
-    for (int j = 1; j <= kMaxSeriesTerms; ++j) {
-        term *= z / (shape + static_cast<double>(j));
-        sum += term;
-        if (term <= sum * (0.25 * kEpsilon)) {
-            break;
-        }
-    }
-    const double prefix =
-        std::exp(-z) * std::pow(z, shape) / kHalfStepGammas[static_cast<std::size_t>(halfSteps)];
-    return prefix * sum;
 }
 
 // x, x^2, x^4, x^8: the powers Estrin's scheme multiplies by.
@@ -183,6 +113,152 @@ template <std::size_t N>
 template <std::size_t M, std::size_t N>
 [[gnu::always_inline]] inline double polynomialLeading(const double (&c)[N], const PowersOfTwo& x) {
     return estrin<0, M>(c, x);
+}
+
+constexpr std::size_t kHalfStepCount = 2 * kMaxFiniteSumShape + 2;
+
+// Gamma(h/2 + 1) for h = 0..2*kMaxFiniteSumShape + 1 (so shape! for whole and half-whole shapes),
+// by the recurrence Gamma(z + 1) = z Gamma(z) from Gamma(1) = 1 and Gamma(3/2) = sqrt(pi)/2,
+// accumulated in long double and rounded once.
+constexpr std::array<double, kHalfStepCount> makeHalfStepGammas() {
+    std::array<double, kHalfStepCount> table{};
+    long double whole = 1.0L;
+    long double half = 0.5L * kRootPi;
+    for (std::size_t h = 0; h < kHalfStepCount; ++h) {
+        const long double shape = 0.5L * static_cast<long double>(h);
+        if (h % 2 == 0) {
+            if (h > 0) {
+                whole *= shape;
+            }
+            table[h] = static_cast<double>(whole);
+        } else {
+            if (h > 1) {
+                half *= shape;
+            }
+            table[h] = static_cast<double>(half);
+        }
+    }
+    return table;
+}
+constexpr std::array<double, kHalfStepCount> kHalfStepGammas = makeHalfStepGammas();
+
+// 1/Gamma(m + 1) and 1/Gamma(m + 3/2) for m = 0, 1, ...: the coefficients of the lower-tail
+// series for whole and half-whole shapes. Products in long double, each reciprocal rounded once.
+// The last entries fall below the double range and round to zero; the series reaches them only with
+// terms far below its sum.
+constexpr std::size_t kReciprocalGammaCount = 176;
+using ReciprocalGammaTable = std::array<double, kReciprocalGammaCount>;
+
+constexpr ReciprocalGammaTable makeReciprocalGammas(bool halfWhole) {
+    ReciprocalGammaTable table{};
+    long double gamma = halfWhole ? 0.5L * kRootPi : 1.0L;
+    for (std::size_t m = 0; m < kReciprocalGammaCount; ++m) {
+        if (m > 0) {
+            gamma *= static_cast<long double>(m) + (halfWhole ? 0.5L : 0.0L);
+        }
+        table[m] = static_cast<double>(1.0L / gamma);
+    }
+    return table;
+}
+constexpr ReciprocalGammaTable kReciprocalFactorials = makeReciprocalGammas(false);
+constexpr ReciprocalGammaTable kReciprocalHalfGammas = makeReciprocalGammas(true);
+
+// The table for a whole (even halfSteps) or half-whole shape, from the entry of Gamma(shape + 1).
+const double* reciprocalGammasFrom(int halfSteps) {
+    const ReciprocalGammaTable& table =
+        halfSteps % 2 == 0 ? kReciprocalFactorials : kReciprocalHalfGammas;
+    return table.data() + halfSteps / 2;
+}
+
+// c[0] + c[1] x + ... + c[7] x^7 by Estrin's scheme.
+[[gnu::always_inline]] inline double blockOfEight(const double* c, const PowersOfTwo& x) {
+    const double low = (c[0] + c[1] * x.value[0]) + x.value[1] * (c[2] + c[3] * x.value[0]);
+    const double high = (c[4] + c[5] * x.value[0]) + x.value[1] * (c[6] + c[7] * x.value[0]);
+    return low + x.value[2] * high;
+}
+
+// 1 + r_1 (1 + r_2 (... (1 + r_{count-1}))) with r_k = z / (k + offset), offset 0 or 1/2 (parity
+// 0 or 1): the sum of the ratios' running products in nested form, which damps the rounding of
+// the inner levels. Four levels at a time, so that the chain of dependent operations is one
+// multiply-add per four terms; the products within a group are formed off that chain.
+double nestedRatioSum(double z, int count, int parity) {
+    const double offset = 0.5 * static_cast<double>(parity);
+    double nested = 1.0;
+    int k = count - 1;
+    for (; k >= 4; k -= 4) {
+        const double r0 = z / (static_cast<double>(k - 3) + offset);
+        const double r1 = z / (static_cast<double>(k - 2) + offset);
+        const double r2 = z / (static_cast<double>(k - 1) + offset);
+        const double r3 = z / (static_cast<double>(k) + offset);
+        const double p1 = r0 * r1;
+        const double p2 = p1 * r2;
+        const double head = ((1.0 + r0) + p1) + p2;
+        nested = head + (p2 * r3) * nested;
+    }
+    for (; k >= 1; --k) {
+        nested = 1.0 + nested * (z / (static_cast<double>(k) + offset));
+    }
+    return nested;
+}
+
+double erfcOfRoot(double y, double expMinusY);
+
+// Upper tail of a whole shape n: exp(-z) sum_{k<n} z^k / k!; of a half-whole shape m + 1/2:
+// erfc(sqrt z) + exp(-z) sum_{k<m} z^{k+1/2} / Gamma(k + 3/2). Both sums in nested form; all
+// terms are positive, so they keep their relative accuracy.
+double finiteSumUpperTail(double z, int halfSteps) {
+    const double expMinusZ = std::exp(-z);
+    const int terms = halfSteps / 2;
+    if (halfSteps % 2 == 0) {
+        return expMinusZ * nestedRatioSum(z, terms, 0);
+    }
+    const double complement = erfcOfRoot(z, expMinusZ);
+    if (terms == 0) {
+        return complement;
+    }
+    constexpr double kTwoOverRootPi = 1.128379167095512573896158903121545172;
+    return complement + kTwoOverRootPi * std::sqrt(z) * expMinusZ * nestedRatioSum(z, terms, 1);
+}
+
+// Lower tail exp(-z) z^a sum_j z^j / Gamma(a + j + 1) for z < a - 1: all terms positive and
+// decreasing, so the small tail keeps its relative accuracy.
+//
+// From kTemmeMinShape on, where the series is long and the integrands of the tolerance factors
+// call it thousands of times, eight terms at a time from tabulated coefficients until a block no
+// longer shows in the sum. Smaller shapes keep the term-by-term ratios: their series are short,
+// and the exponential model's Newton-Raphson solutions for small samples move by 1e-6 with the
+// last bits of these probabilities.
+double seriesLowerTail(double z, int halfSteps) {
+    const double shape = 0.5 * static_cast<double>(halfSteps);
+    if (shape < kTemmeMinShape) {
+        double term = 1.0;
+        double sum = 1.0;
+        for (int j = 1; j <= kMaxSeriesTerms; ++j) {
+            term *= z / (shape + static_cast<double>(j));
+            sum += term;
+            if (term <= sum * (0.25 * kEpsilon)) {
+                break;
+            }
+        }
+        const double prefix = std::exp(-z) * std::pow(z, shape) /
+                              kHalfStepGammas[static_cast<std::size_t>(halfSteps)];
+        return prefix * sum;
+    }
+    constexpr double kBlockTolerance = 0.0625 * kEpsilon;
+    const double* coefficients = reciprocalGammasFrom(halfSteps);
+    const std::size_t available = kReciprocalGammaCount - static_cast<std::size_t>(halfSteps / 2);
+    const PowersOfTwo powers(z);
+    double power = 1.0;
+    double sum = 0.0;
+    for (std::size_t first = 0; first + 8 <= available; first += 8) {
+        const double block = power * blockOfEight(coefficients + first, powers);
+        sum += block;
+        if (block <= sum * kBlockTolerance) {
+            break;
+        }
+        power *= powers.value[3];
+    }
+    return std::exp(-z) * std::pow(z, shape) * sum;
 }
 
 // Two polynomials at once, one per lane of an SSE2 register (a GCC and Clang vector extension):
@@ -539,9 +615,18 @@ double gammaTail(bool upperTail, double z, double shape) {
     }
     // Far from the shape the smaller tail is below exp(-a (r - 1 - ln r)), r = z/a (Chernoff's
     // bound); once that is under 2^-57 the larger tail rounds to exactly 1, whatever the route.
+    // ln r <= (r - 1/r) / 2 for r >= 1 and -ln r >= 2 (1 - r) / (1 + r) for r < 1 bound the
+    // exponent from below without a logarithm, which settles most saturated calls; the rest take
+    // the exact exponent.
     if (upperTail == (z < shape) && (z >= 2.0 * shape || z <= 0.5 * shape)) {
         const double ratio = z / shape;
-        if (shape * (ratio - 1.0 - std::log(ratio)) > kSaturationExponent) return 1.0;
+        const double deviation = ratio - 1.0;
+        const double quickBound = shape * deviation * deviation;
+        if (quickBound > (ratio > 1.0 ? 2.0 * kSaturationExponent * ratio
+                                      : kSaturationExponent * (1.0 + ratio)) ||
+            shape * (ratio - 1.0 - std::log(ratio)) > kSaturationExponent) {
+            return 1.0;
+        }
     }
     const double temmeDistance =
         shape >= kTemmeWideShape ? kTemmeWideDistance : kTemmeNarrowDistance;
