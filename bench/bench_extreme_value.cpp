@@ -1,6 +1,6 @@
 // Two-sided Weibull tolerance intervals, fit included: through the entry point (node values
-// computed once, range shared by both factors) and through the straightforward evaluation of the
-// same equation.
+// computed once, range shared by both factors, points too small to change a sum left out) and
+// through the straightforward evaluation of the same equation.
 //
 //   build/<dir>/bench/bench_extreme_value --benchmark_min_time=0.2 --benchmark_repetitions=5
 //       --benchmark_report_aggregates_only=true

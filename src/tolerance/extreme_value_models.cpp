@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <cmath>
 #include <cstddef>
+#include <cstdint>
+#include <cstring>
 #include <limits>
 #include <utility>
 
@@ -74,10 +76,15 @@ double density(const std::vector<double>& residuals, double sumOfResiduals, doub
     return densityFromMean(n, sumOfResiduals, z, meanExponential(residuals, z));
 }
 
+// -ln(p) exp(-k z) n S(z), the argument of the gamma distribution function.
+double gammaArgument(double minusLogProportion, double k, double z, double n, double mean) {
+    return minusLogProportion * std::exp(-k * z) * n * mean;
+}
+
 // P(Gamma(n, 1) <= -ln(p) exp(-k z) n S(z)).
 double coverageProbability(double minusLogProportion, double k, double z, double n, double mean) {
-    const double x = minusLogProportion * std::exp(-k * z) * n * mean;
-    return qdr_GetGammaCdf(QDR_LOWER_TAIL, x, n, 1.0, 0.0);
+    return qdr_GetGammaCdf(QDR_LOWER_TAIL, gammaArgument(minusLogProportion, k, z, n, mean), n, 1.0,
+                           0.0);
 }
 
 // --- Logarithmic form of g ------------------------------------------------------------------
@@ -262,6 +269,12 @@ double fillNodeValues(EquationSetup& setup, const ResidualSummary* logarithmic, 
         sum = sum +
               setup.weights[pair] * (values.densities[2 * pair] + values.densities[2 * pair + 1]);
     }
+    values.logMeans.resize(2 * pairs);
+    values.logDensities.resize(2 * pairs);
+    for (std::size_t point = 0; point < 2 * pairs; ++point) {
+        values.logMeans[point] = std::log(values.means[point]);
+        values.logDensities[point] = std::log(values.densities[point]);
+    }
     return half * sum;
 }
 
@@ -308,6 +321,86 @@ bool prepareEquation(const SExtremeValueModelTI& model, EquationSetup& setup, bo
     setup.normalizingConstant = 1.0 / integral;
     return true;
 }
+
+// --- Terms that cannot change the integral --------------------------------------------------
+//
+// An evaluation of F adds w_j (H(z+) + H(z-)) pair by pair to a running sum of non-negative
+// terms. A value below half an ulp of what it is added to leaves that unchanged, so a point whose
+// H is bounded that far below needs no gamma distribution function: the sum keeps its bits. With
+// t = x / (a + 1) <= 1/2, the series of the lower tail gives
+//   ln P(Gamma(a, 1) <= x) <= a ln x - x - ln Gamma(a + 1) - ln(1 - t),  -ln(1 - t) <= t / (1 - t),
+// and Stirling's formula bounds Gamma(a + 1) from below.
+
+constexpr double kLogTwo = 0.693147180559945309417232121458176568;
+constexpr double kLogHalfUlp = -54.0 * kLogTwo;  // below 2^-54 v, less than half an ulp of v
+
+// ln of a lower bound of v: its binary exponent; -inf unless v is positive, normal and finite.
+double logFloor(double v) {
+    if (!(v >= std::numeric_limits<double>::min()) || !(v <= std::numeric_limits<double>::max())) {
+        return -kInfinity;
+    }
+    std::uint64_t bits = 0;
+    std::memcpy(&bits, &v, sizeof bits);
+    const int exponent = static_cast<int>((bits >> 52) & 0x7ff) - 1023;
+    return static_cast<double>(exponent) * kLogTwo;
+}
+
+class TermBound {
+  public:
+    TermBound(double n, double minusLogProportion, double normalizingConstant,
+              const SevNodeValues& values)
+        : mShape(n),
+          mReciprocalShapePlusOne(1.0 / (n + 1.0)),
+          mValues(values),
+          mLogScale(std::log(minusLogProportion) + std::log(n)),
+          mUnitConstant(std::log(normalizingConstant) + kRelativeSlack),
+          mLowerTailConstant(mUnitConstant + slackForRounding(n, mLogScale) -
+                             ((n + 0.5) * std::log(n) - n + 0.5 * std::log(2.0 * kPi))),
+          mUsable(n >= 1.0 && std::isfinite(mLogScale) && std::isfinite(mLowerTailConstant)) {}
+
+    // ln of an upper bound of H at the point, x being the gamma argument formed there for k;
+    // +inf where none is known.
+    double logValue(double k, double x, std::size_t point) const {
+        const double logDensity = mValues.logDensities[point];
+        if (!mUsable || !(x >= 0.0) || !(logDensity < kInfinity)) return kInfinity;
+        // G <= 1 wherever x is finite.
+        const double unitBound = mUnitConstant + logDensity;
+        const double t = x * mReciprocalShapePlusOne;
+        if (!(t <= 0.5)) return std::isfinite(x) ? unitBound : kInfinity;
+        // ln x from the logarithms already at hand, good to a few ulps of its terms while x is a
+        // normal number; below that G is far under any threshold either way.
+        const double exponent = -k * mValues.points[point];
+        const double logMean = mValues.logMeans[point];
+        if (!(exponent < kLargestExponent) || !(std::fabs(logMean) < kLargestExponent)) {
+            return unitBound;
+        }
+        const double logX = std::max(mLogScale + exponent + logMean, kLogSmallest);
+        // -ln(1 - t) <= t / (1 - t) <= 2t.
+        return std::min(mShape * logX - x + 2.0 * t + mLowerTailConstant + logDensity, unitBound);
+    }
+
+  private:
+    static constexpr double kPi = 3.141592653589793238462643383279502884;
+    static constexpr double kLogSmallest = -707.7;  // just above ln of the smallest normal double
+    // |-k z| and |ln S| stay below this wherever the lower-tail bound is used.
+    static constexpr double kLargestExponent = 700.0;
+    // A distribution function good to a few ulps and the rounding of the products, with room.
+    static constexpr double kRelativeSlack = 1e-6;
+
+    // The rounding of ln x (its three terms, each below 710 in magnitude), magnified by the shape.
+    static double slackForRounding(double n, double logScale) {
+        constexpr double kRoundingPerTerm = 32.0 * std::numeric_limits<double>::epsilon();
+        return kRoundingPerTerm * n * (std::fabs(logScale) + 2.0 * kLargestExponent + 1.0);
+    }
+
+    double mShape;
+    double mReciprocalShapePlusOne;
+    const SevNodeValues& mValues;
+    double mLogScale;
+    double mUnitConstant;
+    double mLowerTailConstant;
+    bool mUsable;
+};
 
 // --- Root ------------------------------------------------------------------------------------
 
@@ -411,6 +504,14 @@ double SExtremeKFactorIntegralFunction::operator()(double k) {
     return value;
 }
 
+void SExtremeKFactorIntegralFunction::useNodeValues(const SevNodeValues* values) {
+    mNodeValues = values;
+    mLogWeights.resize(mWeights.size());
+    for (std::size_t pair = 0; pair < mWeights.size(); ++pair) {
+        mLogWeights[pair] = std::log(mWeights[pair]);
+    }
+}
+
 double SExtremeKFactorIntegralFunction::evaluateAfresh(double k) {
     SExtremeKFactorIntegrand integrand(mProportion, k, mSumOfResiduals, mNormalizingConstant,
                                        mResiduals);
@@ -427,18 +528,34 @@ double SExtremeKFactorIntegralFunction::evaluateFromNodeValues(double k) const {
     const std::vector<double>& means = mNodeValues->means;
     const std::vector<double>& densities = mNodeValues->densities;
     const std::size_t pairs = std::min(mWeights.size(), points.size() / 2);
+    const TermBound bound(n, minusLogProportion, mNormalizingConstant, *mNodeValues);
+    auto value = [&](std::size_t point, double x) {
+        return (mNormalizingConstant * qdr_GetGammaCdf(QDR_LOWER_TAIL, x, n, 1.0, 0.0)) *
+               densities[point];
+    };
     double sum = 0.0;
     for (std::size_t pair = 0; pair < pairs; ++pair) {
         const std::size_t right = 2 * pair;
         const std::size_t left = right + 1;
-        const double rightValue =
-            (mNormalizingConstant *
-             coverageProbability(minusLogProportion, k, points[right], n, means[right])) *
-            densities[right];
-        const double leftValue =
-            (mNormalizingConstant *
-             coverageProbability(minusLogProportion, k, points[left], n, means[left])) *
-            densities[left];
+        const double xRight = gammaArgument(minusLogProportion, k, points[right], n, means[right]);
+        const double xLeft = gammaArgument(minusLogProportion, k, points[left], n, means[left]);
+        const double logRight = bound.logValue(k, xRight, right);
+        const double logLeft = bound.logValue(k, xLeft, left);
+        // Both too small for the sum: it stays as it is.
+        if (std::max(logRight, logLeft) + kLogTwo + mLogWeights[pair] <
+            logFloor(sum) + kLogHalfUlp) {
+            continue;
+        }
+        // One too small for the other: their sum is the other.
+        double rightValue = 0.0;
+        double leftValue = 0.0;
+        if (logRight <= logLeft) {
+            leftValue = value(left, xLeft);
+            if (!(logRight < logFloor(leftValue) + kLogHalfUlp)) rightValue = value(right, xRight);
+        } else {
+            rightValue = value(right, xRight);
+            if (!(logLeft < logFloor(rightValue) + kLogHalfUlp)) leftValue = value(left, xLeft);
+        }
         sum = sum + mWeights[pair] * (rightValue + leftValue);
     }
     const double integral = half * sum;
@@ -456,6 +573,27 @@ SevIntegrationRange sevIntegrationRange(const std::vector<double>& residuals) {
     bool logarithmic = false;
     if (!prepareEquation(model, setup, &logarithmic)) return {kNaN, kNaN, logarithmic};
     return {setup.lower, setup.upper, logarithmic};
+}
+
+std::vector<SevEquationValue> sevEquationValues(const std::vector<double>& residuals,
+                                                double alphaLevel, double proportion,
+                                                const std::vector<double>& ks) {
+    SExtremeValueModelTI model(nullptr, 0, alphaLevel, proportion, kel_TwoSided);
+    EquationSetup setup;
+    setup.residuals = residuals;
+    for (const double residual : residuals) {
+        setup.sumOfResiduals = setup.sumOfResiduals + residual;
+    }
+    model.getGaussLegendreWeights(setup.nodes, setup.weights);
+    bool logarithmic = false;
+    std::vector<SevEquationValue> values;
+    if (!prepareEquation(model, setup, &logarithmic)) return values;
+    SExtremeKFactorIntegralFunction equation(setup.residuals, proportion, alphaLevel,
+                                             setup.sumOfResiduals, setup.normalizingConstant,
+                                             setup.lower, setup.upper, setup.nodes, setup.weights);
+    equation.useNodeValues(&setup.values);
+    for (const double k : ks) values.push_back({equation(k), equation.evaluateAfresh(k)});
+    return values;
 }
 
 // --- SExtremeValueModelTI ---------------------------------------------------------------------

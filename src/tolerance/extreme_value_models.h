@@ -53,10 +53,15 @@ class SExtremeKFactorIntegrand : public ZRXRealFunction {
 // The values of S and g at the 120 points of the rule on one integration range, formed point by
 // point exactly as the integrands form them. Entries 2j and 2j + 1 belong to mid + offset_j and
 // mid - offset_j, the order in which the quadrature routine visits them.
+//
+// The logarithms of S and g serve only to bound a point's term from above, so that an evaluation
+// can leave out terms too small to change the sum's bits.
 struct SevNodeValues {
     std::vector<double> points;
     std::vector<double> means;
     std::vector<double> densities;
+    std::vector<double> logMeans;
+    std::vector<double> logDensities;
 };
 
 // F(k) = (Q + (-1.0)) + alpha, Q the 120-point integral of H(z; k) over the integration range:
@@ -75,7 +80,7 @@ class SExtremeKFactorIntegralFunction : public ZRXRealFunction {
     double operator()(double k) override;
 
     // The values must belong to this range and rule and outlive the object.
-    void useNodeValues(const SevNodeValues* values) { mNodeValues = values; }
+    void useNodeValues(const SevNodeValues* values);
 
     double evaluateAfresh(double k);
 
@@ -92,6 +97,7 @@ class SExtremeKFactorIntegralFunction : public ZRXRealFunction {
     std::vector<double> mNodes;
     std::vector<double> mWeights;
     const SevNodeValues* mNodeValues = nullptr;
+    std::vector<double> mLogWeights;
     // The root finder starts by evaluating the bracket ends that the bracket search has just
     // evaluated; the last two values are handed back unchanged.
     double mRecentK[2];
@@ -113,6 +119,16 @@ struct SevIntegrationRange {
     bool logarithmic;
 };
 SevIntegrationRange sevIntegrationRange(const std::vector<double>& residuals);
+
+// F at each k for these residuals, through the node values (which leave out terms too small to
+// change the sum) and afresh through the function objects: the two must agree bit for bit.
+struct SevEquationValue {
+    double fromNodeValues;
+    double afresh;
+};
+std::vector<SevEquationValue> sevEquationValues(const std::vector<double>& residuals,
+                                                double alphaLevel, double proportion,
+                                                const std::vector<double>& ks);
 
 // Distribution code 4. location and scale are those of the fit; limits location -/+ K x scale.
 class SExtremeValueModelTI : public ToleranceInterval {
