@@ -562,32 +562,37 @@ double SExtremeKFactorIntegralFunction::evaluateFromNodeValues(double k) const {
     return (integral + (-1.0)) + mAlpha;
 }
 
-SevIntegrationRange sevIntegrationRange(const std::vector<double>& residuals) {
-    SExtremeValueModelTI model(nullptr, 0, 0.05, 0.95, kel_TwoSided);
-    EquationSetup setup;
+namespace {
+
+// The equation of these residuals as the model prepares it; false when no range exists.
+bool prepareForResiduals(const std::vector<double>& residuals, EquationSetup& setup,
+                         bool* logarithmic) {
+    const SExtremeValueModelTI model(nullptr, 0, 0.05, 0.95, kel_TwoSided);
     setup.residuals = residuals;
+    setup.sumOfResiduals = 0.0;
     for (const double residual : residuals) {
         setup.sumOfResiduals = setup.sumOfResiduals + residual;
     }
     model.getGaussLegendreWeights(setup.nodes, setup.weights);
+    return prepareEquation(model, setup, logarithmic);
+}
+
+}  // namespace
+
+SevIntegrationRange sevIntegrationRange(const std::vector<double>& residuals) {
+    EquationSetup setup;
     bool logarithmic = false;
-    if (!prepareEquation(model, setup, &logarithmic)) return {kNaN, kNaN, logarithmic};
+    if (!prepareForResiduals(residuals, setup, &logarithmic)) return {kNaN, kNaN, logarithmic};
     return {setup.lower, setup.upper, logarithmic};
 }
 
 std::vector<SevEquationValue> sevEquationValues(const std::vector<double>& residuals,
                                                 double alphaLevel, double proportion,
                                                 const std::vector<double>& ks) {
-    SExtremeValueModelTI model(nullptr, 0, alphaLevel, proportion, kel_TwoSided);
     EquationSetup setup;
-    setup.residuals = residuals;
-    for (const double residual : residuals) {
-        setup.sumOfResiduals = setup.sumOfResiduals + residual;
-    }
-    model.getGaussLegendreWeights(setup.nodes, setup.weights);
     bool logarithmic = false;
     std::vector<SevEquationValue> values;
-    if (!prepareEquation(model, setup, &logarithmic)) return values;
+    if (!prepareForResiduals(residuals, setup, &logarithmic)) return values;
     SExtremeKFactorIntegralFunction equation(setup.residuals, proportion, alphaLevel,
                                              setup.sumOfResiduals, setup.normalizingConstant,
                                              setup.lower, setup.upper, setup.nodes, setup.weights);
