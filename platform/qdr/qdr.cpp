@@ -115,58 +115,42 @@ template <std::size_t M, std::size_t N>
     return estrin<0, M>(c, x);
 }
 
-constexpr std::size_t kHalfStepCount = 2 * kMaxFiniteSumShape + 2;
-
-// Gamma(h/2 + 1) for h = 0..2*kMaxFiniteSumShape + 1 (so shape! for whole and half-whole shapes),
-// by the recurrence Gamma(z + 1) = z Gamma(z) from Gamma(1) = 1 and Gamma(3/2) = sqrt(pi)/2,
-// accumulated in long double and rounded once.
-constexpr std::array<double, kHalfStepCount> makeHalfStepGammas() {
-    std::array<double, kHalfStepCount> table{};
-    long double whole = 1.0L;
-    long double half = 0.5L * kRootPi;
-    for (std::size_t h = 0; h < kHalfStepCount; ++h) {
-        const long double shape = 0.5L * static_cast<long double>(h);
-        if (h % 2 == 0) {
-            if (h > 0) {
-                whole *= shape;
-            }
-            table[h] = static_cast<double>(whole);
-        } else {
-            if (h > 1) {
-                half *= shape;
-            }
-            table[h] = static_cast<double>(half);
-        }
-    }
-    return table;
-}
-constexpr std::array<double, kHalfStepCount> kHalfStepGammas = makeHalfStepGammas();
-
-// 1/Gamma(m + 1) and 1/Gamma(m + 3/2) for m = 0, 1, ...: the coefficients of the lower-tail
-// series for whole and half-whole shapes. Products in long double, each reciprocal rounded once.
-// The last entries fall below the double range and round to zero; the series reaches them only with
-// terms far below its sum.
-constexpr std::size_t kReciprocalGammaCount = 176;
-using ReciprocalGammaTable = std::array<double, kReciprocalGammaCount>;
-
-constexpr ReciprocalGammaTable makeReciprocalGammas(bool halfWhole) {
-    ReciprocalGammaTable table{};
+// Gamma(m + 1) (whole) or Gamma(m + 3/2) (half-whole) for m = 0 .. Count - 1, or their
+// reciprocals: the recurrence Gamma(z + 1) = z Gamma(z) from Gamma(1) = 1 or Gamma(3/2) =
+// sqrt(pi)/2, accumulated in long double and rounded once.
+template <std::size_t Count>
+constexpr std::array<double, Count> makeGammaTable(bool halfWhole, bool reciprocal) {
+    std::array<double, Count> table{};
     long double gamma = halfWhole ? 0.5L * kRootPi : 1.0L;
-    for (std::size_t m = 0; m < kReciprocalGammaCount; ++m) {
+    for (std::size_t m = 0; m < Count; ++m) {
         if (m > 0) {
             gamma *= static_cast<long double>(m) + (halfWhole ? 0.5L : 0.0L);
         }
-        table[m] = static_cast<double>(1.0L / gamma);
+        table[m] = static_cast<double>(reciprocal ? 1.0L / gamma : gamma);
     }
     return table;
 }
-constexpr ReciprocalGammaTable kReciprocalFactorials = makeReciprocalGammas(false);
-constexpr ReciprocalGammaTable kReciprocalHalfGammas = makeReciprocalGammas(true);
 
-// The table for a whole (even halfSteps) or half-whole shape, from the entry of Gamma(shape + 1).
+// Gamma(shape + 1) for the shapes of the term-by-term series.
+constexpr std::size_t kGammaCount = static_cast<std::size_t>(kMaxFiniteSumShape) + 1;
+constexpr auto kFactorials = makeGammaTable<kGammaCount>(false, false);
+constexpr auto kHalfWholeGammas = makeGammaTable<kGammaCount>(true, false);
+
+// The coefficients 1/Gamma(shape + 1 + j) of the blocked series. The last entries fall below
+// the double range and round to zero; the series reaches them only with terms far below its sum.
+constexpr std::size_t kReciprocalGammaCount = 176;
+constexpr auto kReciprocalFactorials = makeGammaTable<kReciprocalGammaCount>(false, true);
+constexpr auto kReciprocalHalfWholeGammas = makeGammaTable<kReciprocalGammaCount>(true, true);
+
+// Gamma(shape + 1) for a whole (even halfSteps) or half-whole shape.
+double gammaOfShapePlusOne(int halfSteps) {
+    const auto& table = halfSteps % 2 == 0 ? kFactorials : kHalfWholeGammas;
+    return table[static_cast<std::size_t>(halfSteps / 2)];
+}
+
+// The reciprocal table for a whole or half-whole shape, from the entry of Gamma(shape + 1).
 const double* reciprocalGammasFrom(int halfSteps) {
-    const ReciprocalGammaTable& table =
-        halfSteps % 2 == 0 ? kReciprocalFactorials : kReciprocalHalfGammas;
+    const auto& table = halfSteps % 2 == 0 ? kReciprocalFactorials : kReciprocalHalfWholeGammas;
     return table.data() + halfSteps / 2;
 }
 
@@ -240,8 +224,7 @@ double seriesLowerTail(double z, int halfSteps) {
                 break;
             }
         }
-        const double prefix = std::exp(-z) * std::pow(z, shape) /
-                              kHalfStepGammas[static_cast<std::size_t>(halfSteps)];
+        const double prefix = std::exp(-z) * std::pow(z, shape) / gammaOfShapePlusOne(halfSteps);
         return prefix * sum;
     }
     constexpr double kBlockTolerance = 0.0625 * kEpsilon;
