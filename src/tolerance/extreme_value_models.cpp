@@ -271,9 +271,13 @@ double fillNodeValues(EquationSetup& setup, const ResidualSummary* logarithmic, 
     }
     values.logMeans.resize(2 * pairs);
     values.logDensities.resize(2 * pairs);
+    values.logWeights.resize(pairs);
     for (std::size_t point = 0; point < 2 * pairs; ++point) {
         values.logMeans[point] = std::log(values.means[point]);
         values.logDensities[point] = std::log(values.densities[point]);
+    }
+    for (std::size_t pair = 0; pair < pairs; ++pair) {
+        values.logWeights[pair] = std::log(setup.weights[pair]);
     }
     return half * sum;
 }
@@ -352,10 +356,11 @@ class TermBound {
         : mShape(n),
           mReciprocalShapePlusOne(1.0 / (n + 1.0)),
           mValues(values),
-          mLogScale(std::log(minusLogProportion) + std::log(n)),
+          mLogShape(std::log(n)),
+          mLogScale(std::log(minusLogProportion) + mLogShape),
           mUnitConstant(std::log(normalizingConstant) + kRelativeSlack),
           mLowerTailConstant(mUnitConstant + slackForRounding(n, mLogScale) -
-                             ((n + 0.5) * std::log(n) - n + 0.5 * std::log(2.0 * kPi))),
+                             ((n + 0.5) * mLogShape - n + kHalfLogTwoPi)),
           mUsable(n >= 1.0 && std::isfinite(mLogScale) && std::isfinite(mLowerTailConstant)) {}
 
     // ln of an upper bound of H at the point, x being the gamma argument formed there for k;
@@ -380,7 +385,7 @@ class TermBound {
     }
 
   private:
-    static constexpr double kPi = 3.141592653589793238462643383279502884;
+    static constexpr double kHalfLogTwoPi = 0.918938533204672741780329736405617640;
     static constexpr double kLogSmallest = -707.7;  // just above ln of the smallest normal double
     // |-k z| and |ln S| stay below this wherever the lower-tail bound is used.
     static constexpr double kLargestExponent = 700.0;
@@ -396,6 +401,7 @@ class TermBound {
     double mShape;
     double mReciprocalShapePlusOne;
     const SevNodeValues& mValues;
+    double mLogShape;
     double mLogScale;
     double mUnitConstant;
     double mLowerTailConstant;
@@ -504,14 +510,6 @@ double SExtremeKFactorIntegralFunction::operator()(double k) {
     return value;
 }
 
-void SExtremeKFactorIntegralFunction::useNodeValues(const SevNodeValues* values) {
-    mNodeValues = values;
-    mLogWeights.resize(mWeights.size());
-    for (std::size_t pair = 0; pair < mWeights.size(); ++pair) {
-        mLogWeights[pair] = std::log(mWeights[pair]);
-    }
-}
-
 double SExtremeKFactorIntegralFunction::evaluateAfresh(double k) {
     SExtremeKFactorIntegrand integrand(mProportion, k, mSumOfResiduals, mNormalizingConstant,
                                        mResiduals);
@@ -542,7 +540,7 @@ double SExtremeKFactorIntegralFunction::evaluateFromNodeValues(double k) const {
         const double logRight = bound.logValue(k, xRight, right);
         const double logLeft = bound.logValue(k, xLeft, left);
         // Both too small for the sum: it stays as it is.
-        if (std::max(logRight, logLeft) + kLogTwo + mLogWeights[pair] <
+        if (std::max(logRight, logLeft) + kLogTwo + mNodeValues->logWeights[pair] <
             logFloor(sum) + kLogHalfUlp) {
             continue;
         }

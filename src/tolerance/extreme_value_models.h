@@ -54,14 +54,15 @@ class SExtremeKFactorIntegrand : public ZRXRealFunction {
 // point exactly as the integrands form them. Entries 2j and 2j + 1 belong to mid + offset_j and
 // mid - offset_j, the order in which the quadrature routine visits them.
 //
-// The logarithms of S and g serve only to bound a point's term from above, so that an evaluation
-// can leave out terms too small to change the sum's bits.
+// The logarithms of S, g and the pair weights serve only to bound a point's term from above, so
+// that an evaluation can leave out terms too small to change the sum's bits.
 struct SevNodeValues {
     std::vector<double> points;
     std::vector<double> means;
     std::vector<double> densities;
     std::vector<double> logMeans;
     std::vector<double> logDensities;
+    std::vector<double> logWeights;
 };
 
 // F(k) = (Q + (-1.0)) + alpha, Q the 120-point integral of H(z; k) over the integration range:
@@ -80,7 +81,7 @@ class SExtremeKFactorIntegralFunction : public ZRXRealFunction {
     double operator()(double k) override;
 
     // The values must belong to this range and rule and outlive the object.
-    void useNodeValues(const SevNodeValues* values);
+    void useNodeValues(const SevNodeValues* values) { mNodeValues = values; }
 
     double evaluateAfresh(double k);
 
@@ -97,7 +98,6 @@ class SExtremeKFactorIntegralFunction : public ZRXRealFunction {
     std::vector<double> mNodes;
     std::vector<double> mWeights;
     const SevNodeValues* mNodeValues = nullptr;
-    std::vector<double> mLogWeights;
     // The root finder starts by evaluating the bracket ends that the bracket search has just
     // evaluated; the last two values are handed back unchanged.
     double mRecentK[2];
