@@ -58,11 +58,11 @@ constexpr long double kRootPi = 1.772453850905516027298167483341145183L;
 
 // 2 * shape when the shape is a whole or half-whole number up to kMaxFiniteSumShape, else -1.
 int finiteSumHalfSteps(double shape) {
-    const double twice = 2.0 * shape;
-    if (!(shape <= kMaxFiniteSumShape) || std::floor(twice) != twice) {
+    if (!(shape > 0.0 && shape <= kMaxFiniteSumShape)) {
         return -1;
     }
-    return static_cast<int>(twice);
+    const int twice = static_cast<int>(2.0 * shape);
+    return static_cast<double>(twice) == 2.0 * shape ? twice : -1;
 }
 
 // x, x^2, x^4, x^8: the powers Estrin's scheme multiplies by.
@@ -664,15 +664,16 @@ double gammaTail(bool upperTail, double z, double shape) {
     // Far from the shape the smaller tail is below exp(-a (r - 1 - ln r)), r = z/a (Chernoff's
     // bound); once that is under 2^-57 the larger tail rounds to exactly 1, whatever the route.
     // ln r <= (r - 1/r) / 2 for r >= 1 and -ln r >= 2 (1 - r) / (1 + r) for r < 1 bound the
-    // exponent from below without a logarithm, which settles most saturated calls; the rest take
-    // the exact exponent.
+    // exponent from below by (z - a)^2 / (2 z) and (z - a)^2 / (z + a), which settles most
+    // saturated calls without a division or a logarithm; the rest take the exact exponent.
     if (upperTail == (z < shape) && (z >= 2.0 * shape || z <= 0.5 * shape)) {
+        const double difference = z - shape;
+        if (difference * difference > (difference > 0.0 ? 2.0 * kSaturationExponent * z
+                                                        : kSaturationExponent * (z + shape))) {
+            return 1.0;
+        }
         const double ratio = z / shape;
-        const double deviation = ratio - 1.0;
-        const double quickBound = shape * deviation * deviation;
-        if (quickBound > (ratio > 1.0 ? 2.0 * kSaturationExponent * ratio
-                                      : kSaturationExponent * (1.0 + ratio)) ||
-            shape * (ratio - 1.0 - std::log(ratio)) > kSaturationExponent) {
+        if (shape * (ratio - 1.0 - std::log(ratio)) > kSaturationExponent) {
             return 1.0;
         }
     }

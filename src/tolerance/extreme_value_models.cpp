@@ -340,48 +340,52 @@ constexpr double kLogHalfUlp = -54.0 * kLogTwo;  // below 2^-54 v, less than hal
 
 // ln of a lower bound of v: its binary exponent; -inf unless v is positive, normal and finite.
 double logFloor(double v) {
-    if (!(v >= std::numeric_limits<double>::min()) || !(v <= std::numeric_limits<double>::max())) {
-        return -kInfinity;
-    }
     std::uint64_t bits = 0;
     std::memcpy(&bits, &v, sizeof bits);
-    const int exponent = static_cast<int>((bits >> 52) & 0x7ff) - 1023;
+    // One unsigned comparison: negative values, zero, subnormals, infinities and NaN all wrap
+    // outside the range of positive normal numbers' bit patterns.
+    constexpr std::uint64_t kSmallestNormal = std::uint64_t{1} << 52;
+    constexpr std::uint64_t kNormalSpan = (std::uint64_t{0x7fe} << 52) + (kSmallestNormal - 1);
+    if (bits - kSmallestNormal >= kNormalSpan) return -kInfinity;
+    const int exponent = static_cast<int>(bits >> 52) - 1023;
     return static_cast<double>(exponent) * kLogTwo;
 }
 
+// The k-free parts of the bound, formed once per equation.
 class TermBound {
   public:
-    TermBound(double n, double minusLogProportion, double normalizingConstant,
-              const SevNodeValues& values)
-        : mShape(n),
-          mReciprocalShapePlusOne(1.0 / (n + 1.0)),
-          mValues(values),
-          mLogShape(std::log(n)),
-          mLogScale(std::log(minusLogProportion) + mLogShape),
+    TermBound(double n, double minusLogProportion, double normalizingConstant)
+        : mLogScale(std::log(minusLogProportion) + std::log(n)),
           mUnitConstant(std::log(normalizingConstant) + kRelativeSlack),
           mLowerTailConstant(mUnitConstant + slackForRounding(n, mLogScale) -
-                             ((n + 0.5) * mLogShape - n + kHalfLogTwoPi)),
+                             ((n + 0.5) * std::log(n) - n + kHalfLogTwoPi)),
           mUsable(n >= 1.0 && std::isfinite(mLogScale) && std::isfinite(mLowerTailConstant)) {}
 
-    // ln of an upper bound of H at the point, x being the gamma argument formed there for k;
-    // +inf where none is known.
-    double logValue(double k, double x, std::size_t point) const {
-        const double logDensity = mValues.logDensities[point];
-        if (!mUsable || !(x >= 0.0) || !(logDensity < kInfinity)) return kInfinity;
+    // Per point: ln of the bound from G <= 1; ln of -ln(p) n S(z), NaN where ln S is too large
+    // for the lower-tail bound; that bound's constant. The bounds are +inf where none is known.
+    void pointConstants(double logDensity, double logMean, double* unit, double* logScaledMean,
+                        double* lowerTail) const {
+        const bool known = mUsable && logDensity < kInfinity;
+        *unit = known ? mUnitConstant + logDensity : kInfinity;
+        *lowerTail = known ? mLowerTailConstant + logDensity : kInfinity;
+        *logScaledMean = std::fabs(logMean) < kLargestExponent ? mLogScale + logMean : std::nan("");
+    }
+
+    // ln of an upper bound of H at a point z, x being the gamma argument formed there for k
+    // and shape n; +inf where none is known.
+    static double logValue(double n, double reciprocalShapePlusOne, double k, double x, double z,
+                           double unit, double logScaledMean, double lowerTail) {
+        if (!(x >= 0.0)) return kInfinity;
         // G <= 1 wherever x is finite.
-        const double unitBound = mUnitConstant + logDensity;
-        const double t = x * mReciprocalShapePlusOne;
-        if (!(t <= 0.5)) return std::isfinite(x) ? unitBound : kInfinity;
+        const double t = x * reciprocalShapePlusOne;
+        if (!(t <= 0.5)) return std::isfinite(x) ? unit : kInfinity;
         // ln x from the logarithms already at hand, good to a few ulps of its terms while x is a
         // normal number; below that G is far under any threshold either way.
-        const double exponent = -k * mValues.points[point];
-        const double logMean = mValues.logMeans[point];
-        if (!(exponent < kLargestExponent) || !(std::fabs(logMean) < kLargestExponent)) {
-            return unitBound;
-        }
-        const double logX = std::max(mLogScale + exponent + logMean, kLogSmallest);
+        const double exponent = -k * z;
+        if (!(exponent < kLargestExponent) || std::isnan(logScaledMean)) return unit;
+        const double logX = std::max(logScaledMean + exponent, kLogSmallest);
         // -ln(1 - t) <= t / (1 - t) <= 2t.
-        return std::min(mShape * logX - x + 2.0 * t + mLowerTailConstant + logDensity, unitBound);
+        return std::min(n * logX - x + 2.0 * t + lowerTail, unit);
     }
 
   private:
@@ -398,10 +402,6 @@ class TermBound {
         return kRoundingPerTerm * n * (std::fabs(logScale) + 2.0 * kLargestExponent + 1.0);
     }
 
-    double mShape;
-    double mReciprocalShapePlusOne;
-    const SevNodeValues& mValues;
-    double mLogShape;
     double mLogScale;
     double mUnitConstant;
     double mLowerTailConstant;
@@ -518,18 +518,40 @@ double SExtremeKFactorIntegralFunction::evaluateAfresh(double k) {
     return (integral + (-1.0)) + mAlpha;
 }
 
+void SExtremeKFactorIntegralFunction::useNodeValues(const SevNodeValues* values) {
+    mNodeValues = values;
+    if (values == nullptr) return;
+    const double n = static_cast<double>(mResiduals.size());
+    mMinusLogProportion = -std::log(mProportion);
+    const TermBound bound(n, mMinusLogProportion, mNormalizingConstant);
+    const std::size_t points = values->points.size();
+    mUnitBounds.resize(points);
+    mLogScaledMeans.resize(points);
+    mLowerTailBounds.resize(points);
+    for (std::size_t point = 0; point < points; ++point) {
+        bound.pointConstants(values->logDensities[point], values->logMeans[point],
+                             &mUnitBounds[point], &mLogScaledMeans[point],
+                             &mLowerTailBounds[point]);
+    }
+}
+
 double SExtremeKFactorIntegralFunction::evaluateFromNodeValues(double k) const {
     const double n = static_cast<double>(mResiduals.size());
-    const double minusLogProportion = -std::log(mProportion);
+    const double minusLogProportion = mMinusLogProportion;
     const double half = 0.5 * (mUpperIntegrationLimit - mLowerIntegrationLimit);
     const std::vector<double>& points = mNodeValues->points;
     const std::vector<double>& means = mNodeValues->means;
     const std::vector<double>& densities = mNodeValues->densities;
     const std::size_t pairs = std::min(mWeights.size(), points.size() / 2);
-    const TermBound bound(n, minusLogProportion, mNormalizingConstant, *mNodeValues);
     auto value = [&](std::size_t point, double x) {
         return (mNormalizingConstant * qdr_GetGammaCdf(QDR_LOWER_TAIL, x, n, 1.0, 0.0)) *
                densities[point];
+    };
+    const double reciprocalShapePlusOne = 1.0 / (n + 1.0);
+    auto logBound = [&](std::size_t point, double x) {
+        return TermBound::logValue(n, reciprocalShapePlusOne, k, x, points[point],
+                                   mUnitBounds[point], mLogScaledMeans[point],
+                                   mLowerTailBounds[point]);
     };
     double sum = 0.0;
     for (std::size_t pair = 0; pair < pairs; ++pair) {
@@ -537,8 +559,8 @@ double SExtremeKFactorIntegralFunction::evaluateFromNodeValues(double k) const {
         const std::size_t left = right + 1;
         const double xRight = gammaArgument(minusLogProportion, k, points[right], n, means[right]);
         const double xLeft = gammaArgument(minusLogProportion, k, points[left], n, means[left]);
-        const double logRight = bound.logValue(k, xRight, right);
-        const double logLeft = bound.logValue(k, xLeft, left);
+        const double logRight = logBound(right, xRight);
+        const double logLeft = logBound(left, xLeft);
         // Both too small for the sum: it stays as it is.
         if (std::max(logRight, logLeft) + kLogTwo + mNodeValues->logWeights[pair] <
             logFloor(sum) + kLogHalfUlp) {

@@ -12,6 +12,7 @@
 #define KELSTAT_TOLERANCE_EXTREME_VALUE_MODELS_H
 
 #include <cstdint>
+#include <limits>
 #include <vector>
 
 #include "numerics/real_function.h"
@@ -81,7 +82,7 @@ class SExtremeKFactorIntegralFunction : public ZRXRealFunction {
     double operator()(double k) override;
 
     // The values must belong to this range and rule and outlive the object.
-    void useNodeValues(const SevNodeValues* values) { mNodeValues = values; }
+    void useNodeValues(const SevNodeValues* values);
 
     double evaluateAfresh(double k);
 
@@ -98,6 +99,13 @@ class SExtremeKFactorIntegralFunction : public ZRXRealFunction {
     std::vector<double> mNodes;
     std::vector<double> mWeights;
     const SevNodeValues* mNodeValues = nullptr;
+    // -ln p, and the constants of the bounds that let an evaluation leave out terms too small to
+    // change the sum (per point: ln of the bound from G <= 1, ln of -ln(p) n S(z), and the constant
+    // of the lower-tail bound), formed once by useNodeValues.
+    double mMinusLogProportion = std::numeric_limits<double>::quiet_NaN();
+    std::vector<double> mUnitBounds;
+    std::vector<double> mLogScaledMeans;
+    std::vector<double> mLowerTailBounds;
     // The root finder starts by evaluating the bracket ends that the bracket search has just
     // evaluated; the last two values are handed back unchanged.
     double mRecentK[2];
