@@ -553,12 +553,19 @@ double SExtremeKFactorIntegralFunction::evaluateFromNodeValues(double k) const {
                                    mUnitBounds[point], mLogScaledMeans[point],
                                    mLowerTailBounds[point]);
     };
+    // The gamma arguments first, in a loop of their own: the exponentials then overlap instead of
+    // waiting on the distribution function.
+    std::vector<double>& arguments = mArguments;
+    arguments.resize(2 * pairs);
+    for (std::size_t point = 0; point < 2 * pairs; ++point) {
+        arguments[point] = gammaArgument(minusLogProportion, k, points[point], n, means[point]);
+    }
     double sum = 0.0;
     for (std::size_t pair = 0; pair < pairs; ++pair) {
         const std::size_t right = 2 * pair;
         const std::size_t left = right + 1;
-        const double xRight = gammaArgument(minusLogProportion, k, points[right], n, means[right]);
-        const double xLeft = gammaArgument(minusLogProportion, k, points[left], n, means[left]);
+        const double xRight = arguments[right];
+        const double xLeft = arguments[left];
         const double logRight = logBound(right, xRight);
         const double logLeft = logBound(left, xLeft);
         // Both too small for the sum: it stays as it is.

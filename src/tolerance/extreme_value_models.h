@@ -106,6 +106,8 @@ class SExtremeKFactorIntegralFunction : public ZRXRealFunction {
     std::vector<double> mUnitBounds;
     std::vector<double> mLogScaledMeans;
     std::vector<double> mLowerTailBounds;
+    // Scratch for the gamma arguments of one evaluation.
+    mutable std::vector<double> mArguments;
     // The root finder starts by evaluating the bracket ends that the bracket search has just
     // evaluated; the last two values are handed back unchanged.
     double mRecentK[2];
