@@ -293,6 +293,8 @@ double seriesLowerTail(double z, int halfSteps) {
         return prefix * sum;
     }
     constexpr double kBlockTolerance = 0.0625 * kEpsilon;
+    // The prefix first: its exponential and powers then run alongside the blocks.
+    const double prefix = std::exp(-z) * powerOfShape(z, halfSteps);
     const double* coefficients = reciprocalGammasFrom(halfSteps);
     const std::size_t available = kReciprocalGammaCount - static_cast<std::size_t>(halfSteps / 2);
     const PowersOfTwo powers(z);
@@ -306,7 +308,7 @@ double seriesLowerTail(double z, int halfSteps) {
         }
         power *= powers.value[3];
     }
-    return std::exp(-z) * powerOfShape(z, halfSteps) * sum;
+    return prefix * sum;
 }
 
 // Two polynomials at once, one per lane of an SSE2 register (a GCC and Clang vector extension):
