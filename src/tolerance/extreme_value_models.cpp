@@ -342,11 +342,12 @@ constexpr double kLogHalfUlp = -54.0 * kLogTwo;  // below 2^-54 v, less than hal
 double logFloor(double v) {
     std::uint64_t bits = 0;
     std::memcpy(&bits, &v, sizeof bits);
-    // One unsigned comparison: negative values, zero, subnormals, infinities and NaN all wrap
-    // outside the range of positive normal numbers' bit patterns.
+    // One unsigned comparison: the 0x7fe << 52 bit patterns of positive normal numbers start at
+    // that of the smallest; negative values, zero and subnormals wrap around below it, and
+    // infinities and NaN lie beyond the span.
     constexpr std::uint64_t kSmallestNormal = std::uint64_t{1} << 52;
-    constexpr std::uint64_t kNormalSpan = (std::uint64_t{0x7fe} << 52) + (kSmallestNormal - 1);
-    if (bits - kSmallestNormal >= kNormalSpan) return -kInfinity;
+    constexpr std::uint64_t kNormalCount = std::uint64_t{0x7fe} << 52;
+    if (bits - kSmallestNormal >= kNormalCount) return -kInfinity;
     const int exponent = static_cast<int>(bits >> 52) - 1023;
     return static_cast<double>(exponent) * kLogTwo;
 }
