@@ -3,7 +3,6 @@
 // qdr_fit.cpp.
 #include "qdr.h"
 
-#include <algorithm>
 #include <array>
 #include <boost/math/distributions/chi_squared.hpp>
 #include <boost/math/distributions/non_central_chi_squared.hpp>
@@ -245,15 +244,13 @@ double downwardFiniteSum(double z, int halfSteps) {
 // erfc(sqrt z) + exp(-z) sum_{k<m} z^{k+1/2} / Gamma(k + 3/2). Both sums in nested form; all
 // terms are positive, so they keep their relative accuracy.
 //
-// From kTemmeMinShape on and for z >= shape - 1, where the terms grow up to the last, the sum is
-// taken from its last term down, as z^(shape-1) sum_j (1/z)^j / Gamma(shape - j), eight terms at a
-// time from the tabulated reciprocal gammas: no divisions but one, and the largest terms meet
-// the fewest roundings.
-double finiteSumUpperTail(double z, int halfSteps) {
+// With downwards set (the caller's choice for shapes from kTemmeMinShape and z >= shape - 1, where
+// the terms grow up to the last), the sum is taken from its last term down, as
+// z^(shape-1) sum_j (1/z)^j / Gamma(shape - j), eight terms at a time from the tabulated
+// reciprocal gammas: no divisions but one, and the largest terms meet the fewest roundings.
+double finiteSumUpperTail(double z, int halfSteps, bool downwards) {
     const double expMinusZ = std::exp(-z);
     const int terms = halfSteps / 2;
-    const bool downwards = halfSteps >= 2 * static_cast<int>(kTemmeMinShape) &&
-                           z >= 0.5 * static_cast<double>(halfSteps) - 1.0;
     if (halfSteps % 2 == 0) {
         return downwards ? expMinusZ * downwardFiniteSum(z, halfSteps)
                          : expMinusZ * nestedRatioSum(z, terms, 0);
@@ -683,20 +680,17 @@ double gammaTail(bool upperTail, double z, double shape) {
     const bool finiteSum = halfSteps >= 0 && z <= kMaxFiniteSumArgument;
     // From shape - 1 up, the finite sum taken downwards is cheaper than Temme's expansion and
     // as accurate; the lower tail it gives as a complement is then at least about 0.45.
-    if (finiteSum && shape >= kTemmeMinShape && z >= shape - 1.0) {
-        const double upper = finiteSumUpperTail(z, halfSteps);
-        return upperTail ? upper : 1.0 - upper;
-    }
+    const bool downwards = finiteSum && shape >= kTemmeMinShape && z >= shape - 1.0;
     const double temmeDistance =
         shape >= kTemmeWideShape ? kTemmeWideDistance : kTemmeNarrowDistance;
-    if (shape >= kTemmeMinShape && std::fabs(z - shape) <= temmeDistance * shape) {
+    if (!downwards && shape >= kTemmeMinShape && std::fabs(z - shape) <= temmeDistance * shape) {
         return temmeTail(upperTail, z, shape);
     }
     if (finiteSum) {
         // The finite sum has only positive terms, so it gives the upper tail to a few ulps
         // everywhere; the lower tail takes it where that tail is the larger one.
         if (upperTail || z >= shape - 1.0) {
-            const double upper = finiteSumUpperTail(z, halfSteps);
+            const double upper = finiteSumUpperTail(z, halfSteps, downwards);
             return upperTail ? upper : 1.0 - upper;
         }
         return seriesLowerTail(z, halfSteps);
