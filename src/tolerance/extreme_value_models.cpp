@@ -81,10 +81,9 @@ double gammaArgument(double minusLogProportion, double k, double z, double n, do
     return minusLogProportion * std::exp(-k * z) * n * mean;
 }
 
-// P(Gamma(n, 1) <= -ln(p) exp(-k z) n S(z)).
-double coverageProbability(double minusLogProportion, double k, double z, double n, double mean) {
-    return qdr_GetGammaCdf(QDR_LOWER_TAIL, gammaArgument(minusLogProportion, k, z, n, mean), n, 1.0,
-                           0.0);
+// P(Gamma(n, 1) <= x), x the gamma argument: the one call that both evaluations make.
+double coverageProbability(double x, double n) {
+    return qdr_GetGammaCdf(QDR_LOWER_TAIL, x, n, 1.0, 0.0);
 }
 
 // --- Logarithmic form of g ------------------------------------------------------------------
@@ -478,7 +477,8 @@ SExtremeKFactorIntegrand::SExtremeKFactorIntegrand(double proportion, double k,
 double SExtremeKFactorIntegrand::operator()(double z) {
     const double n = static_cast<double>(mResiduals.size());
     const double mean = meanExponential(mResiduals, z);
-    const double coverage = coverageProbability(-std::log(mProportion), mK, z, n, mean);
+    const double coverage =
+        coverageProbability(gammaArgument(-std::log(mProportion), mK, z, n, mean), n);
     return (mNormalizingConstant * coverage) * densityFromMean(n, mSumOfResiduals, z, mean);
 }
 
@@ -545,8 +545,7 @@ double SExtremeKFactorIntegralFunction::evaluateFromNodeValues(double k) const {
     const std::vector<double>& densities = mNodeValues->densities;
     const std::size_t pairs = std::min(mWeights.size(), points.size() / 2);
     auto value = [&](std::size_t point, double x) {
-        return (mNormalizingConstant * qdr_GetGammaCdf(QDR_LOWER_TAIL, x, n, 1.0, 0.0)) *
-               densities[point];
+        return (mNormalizingConstant * coverageProbability(x, n)) * densities[point];
     };
     const double reciprocalShapePlusOne = 1.0 / (n + 1.0);
     auto logBound = [&](std::size_t point, double x) {
