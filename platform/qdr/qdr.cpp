@@ -15,6 +15,7 @@
 #include <utility>
 
 #include "qdr_detail.h"
+#include "specfun/exponential.h"
 
 namespace kelstat {
 namespace qdr_detail {
@@ -249,7 +250,7 @@ double downwardFiniteSum(double z, int halfSteps) {
 // z^(shape-1) sum_j (1/z)^j / Gamma(shape - j), eight terms at a time from the tabulated
 // reciprocal gammas: no divisions but one, and the largest terms meet the fewest roundings.
 double finiteSumUpperTail(double z, int halfSteps, bool downwards) {
-    const double expMinusZ = std::exp(-z);
+    const double expMinusZ = kelstat::exponential(-z);
     const int terms = halfSteps / 2;
     if (halfSteps % 2 == 0) {
         return downwards ? expMinusZ * downwardFiniteSum(z, halfSteps)
@@ -291,7 +292,7 @@ double seriesLowerTail(double z, int halfSteps) {
     }
     constexpr double kBlockTolerance = 0.0625 * kEpsilon;
     // The prefix first: its exponential and powers then run alongside the blocks.
-    const double prefix = std::exp(-z) * powerOfShape(z, halfSteps);
+    const double prefix = kelstat::exponential(-z) * powerOfShape(z, halfSteps);
     const double* coefficients = reciprocalGammasFrom(halfSteps);
     const std::size_t available = kReciprocalGammaCount - static_cast<std::size_t>(halfSteps / 2);
     const PowersOfTwo powers(z);
@@ -552,7 +553,7 @@ double temmeTail(bool upperTail, double z, double shape) {
     const double eta = z < shape ? -std::sqrt(twoOverShape * y) : std::sqrt(twoOverShape * y);
 
     const double series = temmeSeriesForShape(eta, shape, reciprocalShape);
-    const double expMinusY = std::exp(-y);
+    const double expMinusY = kelstat::exponential(-y);
     const double correction = series * expMinusY / std::sqrt(kTwoPi * shape);
     const bool upperIsSmaller = z >= shape;
     const double smallerTail =

@@ -12,6 +12,7 @@
 #include "numerics/golden_section.h"
 #include "numerics/root_finder.h"
 #include "qdr.h"
+#include "specfun/exponential.h"
 #include "tolerance/gauss_legendre_120_table.h"
 
 namespace kelstat {
@@ -53,10 +54,20 @@ constexpr double kWideStep = 25.0;
 constexpr int kMaxBracketSteps = 1200;
 
 // S(z), each term divided by n before it is added, in the order of the residuals.
+// The exponentials go two at a time; the additions keep their order.
 double meanExponential(const std::vector<double>& residuals, double z) {
-    const double n = static_cast<double>(residuals.size());
+    const std::size_t count = residuals.size();
+    const double n = static_cast<double>(count);
     double sum = 0.0;
-    for (const double residual : residuals) sum = sum + std::exp(residual * z) / n;
+    std::size_t i = 0;
+    for (; i + 2 <= count; i += 2) {
+        DoublePair residual;
+        std::memcpy(&residual, &residuals[i], sizeof residual);
+        const DoublePair terms = exponential(residual * z) / n;
+        sum = sum + terms[0];
+        sum = sum + terms[1];
+    }
+    if (i < count) sum = sum + exponential(residuals[i] * z) / n;
     return sum;
 }
 
@@ -64,9 +75,9 @@ double meanExponential(const std::vector<double>& residuals, double z) {
 double densityFromMean(double n, double sumOfResiduals, double z, double mean) {
     if (n >= 3.0) {
         if (!(z > 0.0)) return 0.0;
-        return std::exp(sumOfResiduals * (z - 1.0)) * std::pow(z / mean, n) / (z * z);
+        return exponential(sumOfResiduals * (z - 1.0)) * std::pow(z / mean, n) / (z * z);
     }
-    if (n == 2.0) return std::exp(sumOfResiduals * (z - 1.0)) / (mean * mean);
+    if (n == 2.0) return exponential(sumOfResiduals * (z - 1.0)) / (mean * mean);
     return 0.0;
 }
 
@@ -76,9 +87,11 @@ double density(const std::vector<double>& residuals, double sumOfResiduals, doub
     return densityFromMean(n, sumOfResiduals, z, meanExponential(residuals, z));
 }
 
-// -ln(p) exp(-k z) n S(z), the argument of the gamma distribution function.
-double gammaArgument(double minusLogProportion, double k, double z, double n, double mean) {
-    return minusLogProportion * std::exp(-k * z) * n * mean;
+// -ln(p) exp(-k z) n S(z), the argument of the gamma distribution function; for one point or
+// for two side by side, with the same operations and so the same bits.
+template <class Real>
+Real gammaArgument(double minusLogProportion, double k, Real z, double n, Real mean) {
+    return minusLogProportion * exponential(-k * z) * n * mean;
 }
 
 // P(Gamma(n, 1) <= x), x the gamma argument: the one call that both evaluations make.
@@ -557,8 +570,13 @@ double SExtremeKFactorIntegralFunction::evaluateFromNodeValues(double k) const {
     // waiting on the distribution function.
     std::vector<double>& arguments = mArguments;
     arguments.resize(2 * pairs);
-    for (std::size_t point = 0; point < 2 * pairs; ++point) {
-        arguments[point] = gammaArgument(minusLogProportion, k, points[point], n, means[point]);
+    for (std::size_t point = 0; point < 2 * pairs; point += 2) {
+        DoublePair z;
+        DoublePair mean;
+        std::memcpy(&z, &points[point], sizeof z);
+        std::memcpy(&mean, &means[point], sizeof mean);
+        const DoublePair x = gammaArgument(minusLogProportion, k, z, n, mean);
+        std::memcpy(&arguments[point], &x, sizeof x);
     }
     double sum = 0.0;
     for (std::size_t pair = 0; pair < pairs; ++pair) {
