@@ -16,6 +16,7 @@
 
 #include "qdr_detail.h"
 #include "specfun/exponential.h"
+#include "specfun/extended_power.h"
 
 namespace kelstat {
 namespace qdr_detail {
@@ -156,18 +157,13 @@ const double* reciprocalGammasFrom(int halfSteps) {
 }
 
 // z^a for a whole or half-whole shape a = halfSteps / 2 (z > 0, z^a within the double range):
-// binary powering in x87 extended precision, whose eleven extra bits absorb the rounding of the
-// few products, then one rounding to double: as accurate as pow, at a fraction of its cost.
-// Where long double has no extra bits, pow itself.
+// binary powering in extended precision where there is one, else pow.
 double powerOfShape(double z, int halfSteps) {
-    if constexpr (std::numeric_limits<long double>::digits >= 64) {
-        long double base = z;
-        long double power = halfSteps % 2 == 0 ? 1.0L : std::sqrt(base);
-        for (int exponent = halfSteps / 2; exponent > 0; exponent /= 2) {
-            if (exponent % 2 != 0) power *= base;
-            if (exponent > 1) base *= base;
-        }
-        return static_cast<double>(power);
+    if constexpr (kExtendedPowerAvailable) {
+        const long double base = z;
+        const long double start = halfSteps % 2 == 0 ? 1.0L : std::sqrt(base);
+        return static_cast<double>(
+            extendedPower(start, base, static_cast<unsigned>(halfSteps / 2)));
     } else {
         return std::pow(z, 0.5 * static_cast<double>(halfSteps));
     }

@@ -13,6 +13,7 @@
 #include "numerics/root_finder.h"
 #include "qdr.h"
 #include "specfun/exponential.h"
+#include "specfun/extended_power.h"
 #include "tolerance/gauss_legendre_120_table.h"
 
 namespace kelstat {
@@ -71,11 +72,19 @@ double meanExponential(const std::vector<double>& residuals, double z) {
     return sum;
 }
 
+// S at two points side by side, each lane formed as the single-point form forms it.
+DoublePair meanExponential(const std::vector<double>& residuals, DoublePair z) {
+    const double n = static_cast<double>(residuals.size());
+    DoublePair sum = {0.0, 0.0};
+    for (const double residual : residuals) sum = sum + exponential(residual * z) / n;
+    return sum;
+}
+
 // g(z) from S(z) = mean, with the grouping of the closed form.
 double densityFromMean(double n, double sumOfResiduals, double z, double mean) {
     if (n >= 3.0) {
         if (!(z > 0.0)) return 0.0;
-        return exponential(sumOfResiduals * (z - 1.0)) * std::pow(z / mean, n) / (z * z);
+        return exponential(sumOfResiduals * (z - 1.0)) * wholePower(z / mean, n) / (z * z);
     }
     if (n == 2.0) return exponential(sumOfResiduals * (z - 1.0)) / (mean * mean);
     return 0.0;
@@ -260,10 +269,11 @@ double fillNodeValues(EquationSetup& setup, const ResidualSummary* logarithmic, 
     for (std::size_t remaining = pairs; remaining > 0; --remaining) {
         const std::size_t pair = remaining - 1;
         const double offset = setup.nodes[pair] * half;
-        const double points[2] = {mid + offset, mid - offset};
+        const DoublePair points = {mid + offset, mid - offset};
+        const DoublePair means = meanExponential(setup.residuals, points);
         for (std::size_t side = 0; side < 2; ++side) {
             const double z = points[side];
-            const double mean = meanExponential(setup.residuals, z);
+            const double mean = means[side];
             double g = 0.0;
             if (logarithmic == nullptr) {
                 g = densityFromMean(n, setup.sumOfResiduals, z, mean);
