@@ -198,13 +198,23 @@ inline double exponential(double x) {
 // Two doubles in one SSE2 register (a GCC and Clang vector extension).
 typedef double DoublePair __attribute__((vector_size(16)));
 
+namespace exponential_detail {
+
+// Out of line and cold: of the rare arguments outside the table's range, the hot loops carry only
+// the test.
+[[gnu::cold, gnu::noinline]] inline DoublePair laneByLane(DoublePair x) {
+    return DoublePair{exponential(x[0]), exponential(x[1])};
+}
+
+}  // namespace exponential_detail
+
 // exponential() of both lanes, with the same operations lane by lane and so the same bits; the
 // two reductions and polynomials run side by side.
 inline DoublePair exponential(DoublePair x) {
     using namespace exponential_detail;
     typedef std::uint64_t IntegerPair __attribute__((vector_size(16)));
     if (!(std::fabs(x[0]) < kLargestArgument && std::fabs(x[1]) < kLargestArgument)) {
-        return DoublePair{exponential(x[0]), exponential(x[1])};
+        return exponential_detail::laneByLane(x);
     }
     const DoublePair shifted = x * kStepsPerLog2 + kRoundingShift;
     const IntegerPair steps = __builtin_bit_cast(IntegerPair, shifted) - kRoundingShiftBits;
