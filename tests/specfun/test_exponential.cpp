@@ -72,6 +72,31 @@ TEST(Exponential, PairGivesTheBitsOfTwoSingleCalls) {
     EXPECT_EQ(mixed[1], std::numeric_limits<double>::infinity());
 }
 
+#ifdef KELSTAT_HAVE_AVX2_PATHS
+[[gnu::target("avx2")]] void expectFourLanesLikeSingleCalls(const std::vector<double>& arguments) {
+    using kelstat::DoubleQuad;
+    for (std::size_t i = 0; i + 3 < arguments.size(); i += 4) {
+        const DoubleQuad quad = exponential(
+            DoubleQuad{arguments[i], arguments[i + 1], arguments[i + 2], arguments[i + 3]});
+        for (std::size_t lane = 0; lane < 4; ++lane) {
+            ASSERT_TRUE(sameBits(quad[lane], exponential(arguments[i + lane])))
+                << arguments[i + lane];
+        }
+    }
+}
+
+TEST(Exponential, FourLanesGiveTheBitsOfSingleCalls) {
+    if (!__builtin_cpu_supports("avx2")) GTEST_SKIP() << "no AVX2 on this processor";
+    std::vector<double> arguments = sampleArguments(20000);
+    // Lanes outside the table's range, alone and together with ordinary ones.
+    for (const double x : {800.0, -1.5, std::numeric_limits<double>::quiet_NaN(), 3.25, -750.0,
+                           -750.0, 709.0, 0.0}) {
+        arguments.push_back(x);
+    }
+    expectFourLanesLikeSingleCalls(arguments);
+}
+#endif
+
 TEST(Exponential, EndsOfTheRangeAndSpecialValues) {
     constexpr double kInfinity = std::numeric_limits<double>::infinity();
     EXPECT_EQ(exponential(0.0), 1.0);
