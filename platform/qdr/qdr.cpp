@@ -44,9 +44,11 @@ constexpr int kMaxSeriesTerms = 1000;
 // Shapes from kTemmeMinShape on, with the argument within a relative distance of the shape, take
 // Temme's uniform expansion: there its error stays within the function's own conditioning (the
 // effect of rounding the argument), at a fraction of the cost of a series or a long finite sum.
-// Whole and half-whole shapes up to kMaxFiniteSumShape keep it only below shape - 1; above, their
-// finite sum taken downwards is cheaper still. Below kTemmeWideShape its ten terms in 1/shape fall
-// short on the far lower side, so the window is narrower there.
+// Whole and half-whole shapes up to kMaxFiniteSumShape keep it only for the upper tail below
+// shape - 1: above, their finite sum taken downwards is cheaper still, and their lower tail below
+// shape - 1 takes the blocked series, which costs about half as much there and stays within six
+// ulps where the expansion reached 26 at the window's lower edge. Below kTemmeWideShape its ten
+// terms in 1/shape fall short on the far lower side, so the window is narrower there.
 constexpr double kTemmeMinShape = 20.0;
 constexpr double kTemmeWideShape = 40.0;
 constexpr double kTemmeNarrowDistance = 0.3;
@@ -661,16 +663,22 @@ double gammaTail(bool upperTail, double z, double shape) {
     // bound); once that is under 2^-57 the larger tail rounds to exactly 1, whatever the route.
     // ln r <= (r - 1/r) / 2 for r >= 1 and -ln r >= 2 (1 - r) / (1 + r) for r < 1 bound the
     // exponent from below by (z - a)^2 / (2 z) and (z - a)^2 / (z + a), which settles most
-    // saturated calls without a division or a logarithm; the rest take the exact exponent.
+    // saturated calls without a division or a logarithm. The other sides of those inequalities,
+    // ln r >= 2 (r - 1) / (r + 1) and ln r >= 1 - 1/r, bound it from above by (z - a)^2 / (z + a)
+    // and (z - a)^2 / z: below the threshold there, the call is not saturated. Only the calls in
+    // between take the exact exponent.
     if (upperTail == (z < shape) && (z >= 2.0 * shape || z <= 0.5 * shape)) {
         const double difference = z - shape;
-        if (difference * difference > (difference > 0.0 ? 2.0 * kSaturationExponent * z
-                                                        : kSaturationExponent * (z + shape))) {
+        const double square = difference * difference;
+        const bool above = difference > 0.0;
+        if (square > (above ? 2.0 * kSaturationExponent * z : kSaturationExponent * (z + shape))) {
             return 1.0;
         }
-        const double ratio = z / shape;
-        if (shape * (ratio - 1.0 - std::log(ratio)) > kSaturationExponent) {
-            return 1.0;
+        if (square > (above ? kSaturationExponent * (z + shape) : kSaturationExponent * z)) {
+            const double ratio = z / shape;
+            if (shape * (ratio - 1.0 - std::log(ratio)) > kSaturationExponent) {
+                return 1.0;
+            }
         }
     }
     const int halfSteps = finiteSumHalfSteps(shape);
@@ -680,7 +688,9 @@ double gammaTail(bool upperTail, double z, double shape) {
     const bool downwards = finiteSum && shape >= kTemmeMinShape && z >= shape - 1.0;
     const double temmeDistance =
         shape >= kTemmeWideShape ? kTemmeWideDistance : kTemmeNarrowDistance;
-    if (!downwards && shape >= kTemmeMinShape && std::fabs(z - shape) <= temmeDistance * shape) {
+    const bool lowerSeries = finiteSum && !upperTail && !downwards;
+    if (!downwards && !lowerSeries && shape >= kTemmeMinShape &&
+        std::fabs(z - shape) <= temmeDistance * shape) {
         return temmeTail(upperTail, z, shape);
     }
     if (finiteSum) {
