@@ -54,6 +54,16 @@ constexpr double kFirstStep = 0.5;
 constexpr double kWideStep = 25.0;
 constexpr int kMaxBracketSteps = 1200;
 
+// Whether the processor runs the four-lane (AVX2) loops below; they give the bits of the
+// two-lane ones, only sooner.
+bool haveWideVectors() {
+#ifdef KELSTAT_HAVE_AVX2_PATHS
+    return __builtin_cpu_supports("avx2");
+#else
+    return false;
+#endif
+}
+
 // S(z), each term divided by n before it is added, in the order of the residuals. The
 // exponentials and divisions go two or four at a time; the additions keep their order, so every
 // form gives the same bits.
@@ -108,7 +118,7 @@ constexpr int kMaxBracketSteps = 1200;
 
 double meanExponential(const std::vector<double>& residuals, double z) {
 #ifdef KELSTAT_HAVE_AVX2_PATHS
-    if (__builtin_cpu_supports("avx2")) return meanExponentialFourAtATime(residuals, z);
+    if (haveWideVectors()) return meanExponentialFourAtATime(residuals, z);
 #endif
     const std::size_t count = residuals.size();
     const double n = static_cast<double>(count);
@@ -128,7 +138,7 @@ double meanExponential(const std::vector<double>& residuals, double z) {
 // S at two points side by side.
 DoublePair meanExponential(const std::vector<double>& residuals, DoublePair z) {
 #ifdef KELSTAT_HAVE_AVX2_PATHS
-    if (__builtin_cpu_supports("avx2")) {
+    if (haveWideVectors()) {
         double sums[2];
         meanExponentialAtTwoPoints(residuals, z[0], z[1], sums);
         return DoublePair{sums[0], sums[1]};
@@ -197,18 +207,10 @@ void gammaArgumentsTwoAtATime(double minusLogProportion, double k, double n, con
     gammaArgumentsTwoAtATime(minusLogProportion, k, n, z + point, mean + point, count - point,
                              arguments + point);
 }
-
-bool haveWideVectors() {
-    return __builtin_cpu_supports("avx2");
-}
 #else
 void gammaArgumentsFourAtATime(double minusLogProportion, double k, double n, const double* z,
                                const double* mean, std::size_t count, double* arguments) {
     gammaArgumentsTwoAtATime(minusLogProportion, k, n, z, mean, count, arguments);
-}
-
-bool haveWideVectors() {
-    return false;
 }
 #endif
 
