@@ -219,6 +219,17 @@ double coverageProbability(double x, double n) {
     return qdr_GetGammaCdf(QDR_LOWER_TAIL, x, n, 1.0, 0.0);
 }
 
+// Whether P(Gamma(n, 1) <= x) is 1 to far beyond double precision, so that the distribution
+// function gives exactly 1 and need not be asked. Chernoff's bound puts the upper tail below
+// exp(-n (r - 1 - ln r)), r = x / n; for r >= 2, ln r <= (r - 1/r) / 2 bounds that exponent from
+// below by (x - n)^2 / (2 x), and above e^60 (about 1e26) no distribution function accurate to a
+// few ulps rounds to anything but 1. A third of the points of a typical evaluation lie there.
+bool coverageIsOne(double x, double n) {
+    constexpr double kExponent = 60.0;
+    const double difference = x - n;
+    return x >= 2.0 * n && difference * difference > 2.0 * kExponent * x;
+}
+
 // --- Logarithmic form of g ------------------------------------------------------------------
 //
 // For a few thousand observations and more, exp(c (z - 1)) overflows where (z / S)^n underflows
@@ -680,7 +691,8 @@ double SExtremeKFactorIntegralFunction::evaluateFromNodeValues(double k) const {
     const std::vector<double>& densities = mNodeValues->densities;
     const std::size_t pairs = std::min(mWeights.size(), points.size() / 2);
     auto value = [&](std::size_t point, double x) {
-        return (mNormalizingConstant * coverageProbability(x, n)) * densities[point];
+        const double coverage = coverageIsOne(x, n) ? 1.0 : coverageProbability(x, n);
+        return (mNormalizingConstant * coverage) * densities[point];
     };
     const double reciprocalShapePlusOne = 1.0 / (n + 1.0);
     auto logBound = [&](std::size_t point, double x) {
