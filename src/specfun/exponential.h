@@ -11,6 +11,12 @@
 #include <cstdint>
 #include <cstring>
 
+// Four-lane forms for x86-64 processors with AVX2, compiled for that target function by function.
+#if defined(__x86_64__) && (defined(__GNUC__) || defined(__clang__))
+#include <immintrin.h>
+#define KELSTAT_HAVE_AVX2_PATHS 1
+#endif
+
 namespace kelstat {
 
 namespace exponential_detail {
@@ -20,6 +26,7 @@ struct TableEntry {
     double hi;
     double lo;
 };
+static_assert(sizeof(TableEntry) == 2 * sizeof(double), "the four-lane form gathers by doubles");
 
 inline constexpr TableEntry kPowersOfTwo[128] = {
     {0x1.0000000000000p+0, 0x0.0p+0},
@@ -230,8 +237,7 @@ inline DoublePair exponential(DoublePair x) {
                               __builtin_bit_cast(IntegerPair, mantissa) + exponentField(steps));
 }
 
-#if defined(__x86_64__) && (defined(__GNUC__) || defined(__clang__))
-#define KELSTAT_HAVE_AVX2_PATHS 1
+#ifdef KELSTAT_HAVE_AVX2_PATHS
 
 // Four doubles in one AVX register. Only functions compiled for AVX2 (and called where the
 // processor has it) may use this type and its exponential.
@@ -241,8 +247,10 @@ typedef double DoubleQuad __attribute__((vector_size(32)));
 [[gnu::target("avx2")]] inline DoubleQuad exponential(DoubleQuad x) {
     using namespace exponential_detail;
     typedef std::uint64_t IntegerQuad __attribute__((vector_size(32)));
-    if (!(std::fabs(x[0]) < kLargestArgument && std::fabs(x[1]) < kLargestArgument &&
-          std::fabs(x[2]) < kLargestArgument && std::fabs(x[3]) < kLargestArgument)) {
+    // All four magnitudes below the limit (an ordered comparison: NaN fails it).
+    const __m256d magnitude = _mm256_andnot_pd(_mm256_set1_pd(-0.0), x);
+    const __m256d inRange = _mm256_cmp_pd(magnitude, _mm256_set1_pd(kLargestArgument), _CMP_LT_OQ);
+    if (_mm256_movemask_pd(inRange) != 0xf) {
         const DoublePair low = laneByLane(DoublePair{x[0], x[1]});
         const DoublePair high = laneByLane(DoublePair{x[2], x[3]});
         return DoubleQuad{low[0], low[1], high[0], high[1]};
@@ -256,12 +264,10 @@ typedef double DoubleQuad __attribute__((vector_size(32)));
     const DoubleQuad r2 = r * r;
     const DoubleQuad tail =
         r + r2 * ((0.5 + r * (1.0 / 6.0)) + r2 * (1.0 / 24.0 + r * (1.0 / 120.0)));
-    const TableEntry& e0 = kPowersOfTwo[steps[0] & 127];
-    const TableEntry& e1 = kPowersOfTwo[steps[1] & 127];
-    const TableEntry& e2 = kPowersOfTwo[steps[2] & 127];
-    const TableEntry& e3 = kPowersOfTwo[steps[3] & 127];
-    const DoubleQuad hi = {e0.hi, e1.hi, e2.hi, e3.hi};
-    const DoubleQuad lo = {e0.lo, e1.lo, e2.lo, e3.lo};
+    // The table's hi and lo of entry j sit at doubles 2j and 2j + 1.
+    const __m256i doubles = __builtin_bit_cast(__m256i, (steps & std::uint64_t{127}) << 1);
+    const DoubleQuad hi = _mm256_i64gather_pd(&kPowersOfTwo[0].hi, doubles, sizeof(double));
+    const DoubleQuad lo = _mm256_i64gather_pd(&kPowersOfTwo[0].lo, doubles, sizeof(double));
     const DoubleQuad mantissa = hi + (lo + hi * tail);
     const IntegerQuad field = (steps & ~std::uint64_t{127}) << 45;
     return __builtin_bit_cast(DoubleQuad, __builtin_bit_cast(IntegerQuad, mantissa) + field);
