@@ -54,9 +54,6 @@ constexpr double kTemmeWideShape = 40.0;
 constexpr double kTemmeNarrowDistance = 0.3;
 constexpr double kTemmeWideDistance = 0.4;
 
-// exp(-40) < 2^-57.
-constexpr double kSaturationExponent = 40.0;
-
 constexpr long double kRootPi = 1.772453850905516027298167483341145183L;
 
 // 2 * shape when the shape is a whole or half-whole number up to kMaxFiniteSumShape, else -1.
@@ -646,7 +643,27 @@ double roughNormalQuantile(double p) {
     return -M_SQRT2 * boost::math::erfc_inv(2.0 * p, FastPolicy());
 }
 
-double gammaTail(bool upperTail, double z, double shape) {
+namespace {
+
+// The calls the quick bound leaves open. The other sides of its inequalities,
+// ln r >= 2 (r - 1) / (r + 1) and ln r >= 1 - 1/r, bound the exponent from above by
+// (z - a)^2 / (z + a) and (z - a)^2 / z: below the threshold there, the call is not saturated.
+// Only the calls in between take the exact exponent.
+bool saturatedByExactExponent(double z, double shape) {
+    const double difference = z - shape;
+    const double square = difference * difference;
+    if (!(square >
+          (difference > 0.0 ? kSaturationExponent * (z + shape) : kSaturationExponent * z))) {
+        return false;
+    }
+    const double ratio = z / shape;
+    return shape * (ratio - 1.0 - std::log(ratio)) > kSaturationExponent;
+}
+
+}  // namespace
+
+// Everything but the quick saturation test, which the inline gammaTail makes first.
+double gammaTailBeyondQuickBound(bool upperTail, double z, double shape) {
     if (z <= 0.0) {
         return upperTail ? 1.0 : 0.0;
     }
@@ -659,27 +676,8 @@ double gammaTail(bool upperTail, double z, double shape) {
     if (shape == 0.5) {
         return upperTail ? std::erfc(std::sqrt(z)) : std::erf(std::sqrt(z));
     }
-    // Far from the shape the smaller tail is below exp(-a (r - 1 - ln r)), r = z/a (Chernoff's
-    // bound); once that is under 2^-57 the larger tail rounds to exactly 1, whatever the route.
-    // ln r <= (r - 1/r) / 2 for r >= 1 and -ln r >= 2 (1 - r) / (1 + r) for r < 1 bound the
-    // exponent from below by (z - a)^2 / (2 z) and (z - a)^2 / (z + a), which settles most
-    // saturated calls without a division or a logarithm. The other sides of those inequalities,
-    // ln r >= 2 (r - 1) / (r + 1) and ln r >= 1 - 1/r, bound it from above by (z - a)^2 / (z + a)
-    // and (z - a)^2 / z: below the threshold there, the call is not saturated. Only the calls in
-    // between take the exact exponent.
-    if (upperTail == (z < shape) && (z >= 2.0 * shape || z <= 0.5 * shape)) {
-        const double difference = z - shape;
-        const double square = difference * difference;
-        const bool above = difference > 0.0;
-        if (square > (above ? 2.0 * kSaturationExponent * z : kSaturationExponent * (z + shape))) {
-            return 1.0;
-        }
-        if (square > (above ? kSaturationExponent * (z + shape) : kSaturationExponent * z)) {
-            const double ratio = z / shape;
-            if (shape * (ratio - 1.0 - std::log(ratio)) > kSaturationExponent) {
-                return 1.0;
-            }
-        }
+    if (farFromShape(upperTail, z, shape) && saturatedByExactExponent(z, shape)) {
+        return 1.0;
     }
     const int halfSteps = finiteSumHalfSteps(shape);
     const bool finiteSum = halfSteps >= 0 && z <= kMaxFiniteSumArgument;

@@ -64,9 +64,36 @@ constexpr double kHalleyMinShape = 2.0;
 // does not settle.
 double gammaQuantile(double p, double shape);
 
+// Far from the shape the smaller gamma tail is below exp(-a (r - 1 - ln r)), r = z/a (Chernoff's
+// bound); once that is under 2^-57 (exp(-40)) the larger tail rounds to exactly 1, whatever the
+// route. This applies where the larger tail is asked for and r >= 2 or r <= 1/2.
+constexpr double kSaturationExponent = 40.0;
+
+inline bool farFromShape(bool upperTail, double z, double shape) {
+    return upperTail == (z < shape) && (z >= 2.0 * shape || z <= 0.5 * shape);
+}
+
+// ln r <= (r - 1/r) / 2 for r >= 1 and -ln r >= 2 (1 - r) / (1 + r) for r < 1 bound the exponent
+// from below by (z - a)^2 / (2 z) and (z - a)^2 / (z + a): this settles most saturated calls
+// without a division or a logarithm.
+inline bool saturatedByQuickBound(double z, double shape) {
+    const double difference = z - shape;
+    return difference * difference >
+           (difference > 0.0 ? 2.0 * kSaturationExponent * z : kSaturationExponent * (z + shape));
+}
+
+// gammaTail for the calls the quick bound does not settle.
+double gammaTailBeyondQuickBound(bool upperTail, double z, double shape);
+
 // Gamma distribution function of the unit-scale variable z >= 0: lower tail P(G <= z) when
-// upperTail is false, else P(G > z).
-double gammaTail(bool upperTail, double z, double shape);
+// upperTail is false, else P(G > z). The quick saturation test inlines into the callers: in the
+// extreme-value K-factor integrands a third of the calls end there.
+inline double gammaTail(bool upperTail, double z, double shape) {
+    if (farFromShape(upperTail, z, shape) && saturatedByQuickBound(z, shape)) {
+        return 1.0;
+    }
+    return gammaTailBeyondQuickBound(upperTail, z, shape);
+}
 
 }  // namespace qdr_detail
 }  // namespace kelstat

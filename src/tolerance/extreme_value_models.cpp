@@ -219,19 +219,6 @@ double coverageProbability(double x, double n) {
     return qdr_GetGammaCdf(QDR_LOWER_TAIL, x, n, 1.0, 0.0);
 }
 
-// Whether P(Gamma(n, 1) <= x) is 1 to far beyond double precision, so that the distribution
-// function need not be asked. Chernoff's bound puts the upper tail below exp(-n (r - 1 - ln r)),
-// r = x / n; for r >= 2, ln r <= (r - 1/r) / 2 bounds that exponent from below by
-// (x - n)^2 / (2 x). Where that exceeds 60 the tail is below 1e-26 and the distribution function
-// returns exactly 1 (its own test of the same bound, at 40, has already fired), so the cached
-// evaluation keeps the bits of the straightforward one. About a third of the points of the
-// benchmark's evaluations lie there.
-bool coverageIsOne(double x, double n) {
-    constexpr double kExponent = 60.0;
-    const double difference = x - n;
-    return x >= 2.0 * n && difference * difference > 2.0 * kExponent * x;
-}
-
 // --- Logarithmic form of g ------------------------------------------------------------------
 //
 // For a few thousand observations and more, exp(c (z - 1)) overflows where (z / S)^n underflows
@@ -693,8 +680,7 @@ double SExtremeKFactorIntegralFunction::evaluateFromNodeValues(double k) const {
     const std::vector<double>& densities = mNodeValues->densities;
     const std::size_t pairs = std::min(mWeights.size(), points.size() / 2);
     auto value = [&](std::size_t point, double x) {
-        const double coverage = coverageIsOne(x, n) ? 1.0 : coverageProbability(x, n);
-        return (mNormalizingConstant * coverage) * densities[point];
+        return (mNormalizingConstant * coverageProbability(x, n)) * densities[point];
     };
     const double reciprocalShapePlusOne = 1.0 / (n + 1.0);
     auto logBound = [&](std::size_t point, double x) {
