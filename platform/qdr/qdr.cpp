@@ -220,19 +220,20 @@ double downwardFiniteSum(double z, int halfSteps) {
     double power = 1.0;
     double sum = 0.0;
     int done = 0;
-    for (; done + 8 <= terms; done += 8) {
+    bool settled = false;
+    for (; done + 8 <= terms && !settled; done += 8) {
         const double block = power * blockOfEightDownwards(coefficients - done, powers);
         sum += block;
-        if (block <= sum * kBlockTolerance) {
-            return powerOfShape(z, halfSteps - 2) * sum;
-        }
+        settled = block <= sum * kBlockTolerance;
         power *= powers.value[3];
     }
-    double rest = 0.0;
-    for (int k = 0; k < terms - done; ++k) {
-        rest = rest * powers.value[0] + coefficients[-(terms - 1) + k];
+    if (!settled) {
+        double rest = 0.0;
+        for (int k = 0; k < terms - done; ++k) {
+            rest = rest * powers.value[0] + coefficients[-(terms - 1) + k];
+        }
+        sum += power * rest;
     }
-    sum += power * rest;
     return powerOfShape(z, halfSteps - 2) * sum;
 }
 
@@ -686,9 +687,9 @@ double gammaTailBeyondQuickBound(bool upperTail, double z, double shape) {
     const bool downwards = finiteSum && shape >= kTemmeMinShape && z >= shape - 1.0;
     const double temmeDistance =
         shape >= kTemmeWideShape ? kTemmeWideDistance : kTemmeNarrowDistance;
-    const bool lowerSeries = finiteSum && !upperTail && !downwards;
-    if (!downwards && !lowerSeries && shape >= kTemmeMinShape &&
-        std::fabs(z - shape) <= temmeDistance * shape) {
+    // Whole and half-whole shapes keep Temme's expansion only for the upper tail below shape - 1.
+    const bool ownSums = finiteSum && (!upperTail || downwards);
+    if (!ownSums && shape >= kTemmeMinShape && std::fabs(z - shape) <= temmeDistance * shape) {
         return temmeTail(upperTail, z, shape);
     }
     if (finiteSum) {
