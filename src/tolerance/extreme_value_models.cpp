@@ -54,19 +54,17 @@ constexpr double kFirstStep = 0.5;
 constexpr double kWideStep = 25.0;
 constexpr int kMaxBracketSteps = 1200;
 
+#ifdef KELSTAT_HAVE_AVX2_PATHS
 // Whether the processor runs the four-lane (AVX2) loops below; they give the bits of the
 // two-lane ones, only sooner.
 bool haveWideVectors() {
-#ifdef KELSTAT_HAVE_AVX2_PATHS
     return __builtin_cpu_supports("avx2");
-#else
-    return false;
-#endif
 }
+#endif
 
-// S(z), each term divided by n before it is added, in the order of the residuals. The
-// exponentials and divisions go two or four at a time; the additions keep their order, so every
-// form gives the same bits.
+// S(z), each term divided by n before it is added, in the order of the residuals. Where the
+// processor allows, the exponentials and divisions go four at a time; the additions keep their
+// order, so every form gives the same bits.
 
 #ifdef KELSTAT_HAVE_AVX2_PATHS
 [[gnu::target("avx2")]] double meanExponentialFourAtATime(const std::vector<double>& residuals,
@@ -120,18 +118,9 @@ double meanExponential(const std::vector<double>& residuals, double z) {
 #ifdef KELSTAT_HAVE_AVX2_PATHS
     if (haveWideVectors()) return meanExponentialFourAtATime(residuals, z);
 #endif
-    const std::size_t count = residuals.size();
-    const double n = static_cast<double>(count);
+    const double n = static_cast<double>(residuals.size());
     double sum = 0.0;
-    std::size_t i = 0;
-    for (; i + 2 <= count; i += 2) {
-        DoublePair residual;
-        std::memcpy(&residual, &residuals[i], sizeof residual);
-        const DoublePair terms = exponential(residual * z) / n;
-        sum = sum + terms[0];
-        sum = sum + terms[1];
-    }
-    if (i < count) sum = sum + exponential(residuals[i] * z) / n;
+    for (const double residual : residuals) sum = sum + exponential(residual * z) / n;
     return sum;
 }
 
@@ -175,9 +164,6 @@ Real gammaArgument(double minusLogProportion, double k, Real z, double n, Real m
 
 // The gamma arguments of count points (an even number) from their z and S(z), several at a time
 // with the operations of gammaArgument() lane by lane: the same bits.
-using GammaArguments = void (*)(double minusLogProportion, double k, double n, const double* z,
-                                const double* mean, std::size_t count, double* arguments);
-
 void gammaArgumentsTwoAtATime(double minusLogProportion, double k, double n, const double* z,
                               const double* mean, std::size_t count, double* arguments) {
     for (std::size_t point = 0; point + 2 <= count; point += 2) {
@@ -207,12 +193,18 @@ void gammaArgumentsTwoAtATime(double minusLogProportion, double k, double n, con
     gammaArgumentsTwoAtATime(minusLogProportion, k, n, z + point, mean + point, count - point,
                              arguments + point);
 }
-#else
-void gammaArgumentsFourAtATime(double minusLogProportion, double k, double n, const double* z,
-                               const double* mean, std::size_t count, double* arguments) {
+#endif
+
+void gammaArguments(double minusLogProportion, double k, double n, const double* z,
+                    const double* mean, std::size_t count, double* arguments) {
+#ifdef KELSTAT_HAVE_AVX2_PATHS
+    if (haveWideVectors()) {
+        gammaArgumentsFourAtATime(minusLogProportion, k, n, z, mean, count, arguments);
+        return;
+    }
+#endif
     gammaArgumentsTwoAtATime(minusLogProportion, k, n, z, mean, count, arguments);
 }
-#endif
 
 // P(Gamma(n, 1) <= x), x the gamma argument: the one call that both evaluations make.
 double coverageProbability(double x, double n) {
@@ -630,8 +622,7 @@ SExtremeKFactorIntegralFunction::SExtremeKFactorIntegralFunction(
       mNodes(std::move(nodes)),
       mWeights(std::move(weights)),
       mRecentK{kNaN, kNaN},
-      mRecentValue{kNaN, kNaN},
-      mWideVectors(haveWideVectors()) {}
+      mRecentValue{kNaN, kNaN} {}
 
 double SExtremeKFactorIntegralFunction::operator()(double k) {
     if (mNodeValues == nullptr) return evaluateAfresh(k);
@@ -692,9 +683,8 @@ double SExtremeKFactorIntegralFunction::evaluateFromNodeValues(double k) const {
     // waiting on the distribution function.
     std::vector<double>& arguments = mArguments;
     arguments.resize(2 * pairs);
-    const GammaArguments argumentsOf =
-        mWideVectors ? gammaArgumentsFourAtATime : gammaArgumentsTwoAtATime;
-    argumentsOf(minusLogProportion, k, n, points.data(), means.data(), 2 * pairs, arguments.data());
+    gammaArguments(minusLogProportion, k, n, points.data(), means.data(), 2 * pairs,
+                   arguments.data());
     double sum = 0.0;
     for (std::size_t pair = 0; pair < pairs; ++pair) {
         const std::size_t right = 2 * pair;

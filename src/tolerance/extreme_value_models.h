@@ -112,8 +112,6 @@ class SExtremeKFactorIntegralFunction : public ZRXRealFunction {
     // evaluated; the last two values are handed back unchanged.
     double mRecentK[2];
     double mRecentValue[2];
-    // The processor runs the four-lane (AVX2) loops.
-    bool mWideVectors;
 };
 
 // How calcLowerKFactor evaluates its equation. kReuseNodeValues computes S and g at the quadrature
